@@ -1,0 +1,34 @@
+# GoogleTest from Debian's source package, built by the same cross compiler.
+set(INSTALL_GTEST OFF CACHE BOOL "" FORCE)
+set(BUILD_GMOCK ON CACHE BOOL "" FORCE)
+add_subdirectory(/usr/src/googletest ${CMAKE_BINARY_DIR}/googletest EXCLUDE_FROM_ALL SYSTEM)
+
+# One throwaway Wine prefix per build tree, made once per test run (about 10 s).
+set(MARLIX_WINEPREFIX ${CMAKE_BINARY_DIR}/wineprefix)
+set(MARLIX_WINE_RUN ${CMAKE_SOURCE_DIR}/scripts/wine-run)
+add_test(NAME wine_prefix COMMAND ${CMAKE_SOURCE_DIR}/scripts/wine-prefix ${MARLIX_WINEPREFIX})
+set_tests_properties(wine_prefix PROPERTIES FIXTURES_SETUP wine TIMEOUT 300)
+
+add_library(marlix_test_support STATIC
+  ${CMAKE_SOURCE_DIR}/tests/support/test_main.cpp
+  ${CMAKE_SOURCE_DIR}/tests/support/registry_sandbox.cpp)
+target_include_directories(marlix_test_support PUBLIC ${CMAKE_SOURCE_DIR}/tests)
+target_link_libraries(marlix_test_support PUBLIC marlix_core GTest::gtest GTest::gmock)
+
+# Marks a CTest test as running under Wine in the build's prefix.
+function(marlix_wine_test test_name)
+  set_tests_properties(${test_name} PROPERTIES
+    FIXTURES_REQUIRED wine
+    ENVIRONMENT "WINEPREFIX=${MARLIX_WINEPREFIX};WINEDEBUG=-all"
+    TIMEOUT 600)
+endfunction()
+
+# marlix_test(<name> SOURCES <files...> [LIBS <targets...>])
+# Builds a GoogleTest program with the core and the module's resources, and runs it under Wine.
+function(marlix_test name)
+  cmake_parse_arguments(T "" "" "SOURCES;LIBS" ${ARGN})
+  add_executable(${name} ${T_SOURCES} ${MARLIX_MODULE_RC})
+  target_link_libraries(${name} PRIVATE marlix_test_support ${T_LIBS})
+  add_test(NAME ${name} COMMAND ${name})
+  marlix_wine_test(${name})
+endfunction()

@@ -1,5 +1,15 @@
 #include <windows.h>
 
-// The module's start and stop are driven from the core's module object; the loader
-// only needs an entry point here until that object is linked in.
-extern "C" BOOL WINAPI DllMain(HINSTANCE, DWORD, LPVOID) { return TRUE; }
+#include "server/module_app.h"
+
+extern "C" BOOL WINAPI DllMain(HINSTANCE instance, DWORD reason, LPVOID) {
+  switch (reason) {
+    case DLL_PROCESS_ATTACH:
+      DisableThreadLibraryCalls(instance);
+      return TheModuleApp().InitInstance();
+    case DLL_PROCESS_DETACH:
+      TheModuleApp().ExitInstance();
+      break;
+  }
+  return TRUE;
+}

@@ -1,0 +1,16 @@
+#include "server/class_factory.h"
+
+STDMETHODIMP CClassFactory::CreateInstance(IUnknown* outer, REFIID riid, void** ppv) {
+  if (!ppv) return E_POINTER;
+  *ppv = nullptr;
+  if (outer) return CLASS_E_NOAGGREGATION;
+  return create_(riid, ppv);
+}
+
+STDMETHODIMP CClassFactory::LockServer(BOOL lock) {
+  if (lock)
+    com::LockModule();
+  else
+    com::UnlockModule();
+  return S_OK;
+}

@@ -1,0 +1,26 @@
+#include "server/object_map.h"
+
+#include "server/class_creators.h"
+#include "server/class_ids.h"
+#include "server/resource_ids.h"
+
+namespace {
+const ObjectMapEntry kObjectMap[] = {
+    {&CLSID_MarlixDLShellFolder, IDR_REG_SHELLFOLDER, CreateMarlixDLShellFolder},
+    {&CLSID_MarlixDLShellView, IDR_REG_SHELLVIEW, CreateMarlixDLShellView},
+    {&CLSID_MarlixDLEnumIDList, IDR_REG_ENUMIDLIST, CreateMarlixDLEnumIDList},
+    {&CLSID_MarlixDLExtractIcon, IDR_REG_EXTRACTICON, CreateMarlixDLExtractIcon},
+    {&CLSID_MarlixDLDataObject, IDR_REG_DATAOBJECT, CreateMarlixDLDataObject},
+    {&CLSID_MarlixDLQueryInfo, IDR_REG_QUERYINFO, CreateMarlixDLQueryInfo},
+    {&CLSID_MarlixDLDropTarget, IDR_REG_DROPTARGET, CreateMarlixDLDropTarget},
+    {&CLSID_MarlixDLDropTargetOnListView, IDR_REG_DROPTARGETONLIST, CreateMarlixDLDropTargetOnListView},
+};
+}  // namespace
+
+std::span<const ObjectMapEntry> ModuleObjectMap() noexcept { return kObjectMap; }
+
+const ObjectMapEntry* FindObjectMapEntry(std::span<const ObjectMapEntry> map, REFCLSID clsid) noexcept {
+  for (const auto& entry : map)
+    if (IsEqualCLSID(*entry.clsid, clsid)) return &entry;
+  return nullptr;
+}

@@ -1,0 +1,19 @@
+// Creators of classes whose code is not in the module yet. Whoever brings a class
+// removes its stub here and defines the creator beside the class.
+#include "server/class_creators.h"
+
+namespace {
+HRESULT NotAvailable(void** ppv) {
+  if (ppv) *ppv = nullptr;
+  return CLASS_E_CLASSNOTAVAILABLE;
+}
+}  // namespace
+
+HRESULT CreateMarlixDLShellFolder(REFIID, void** ppv) { return NotAvailable(ppv); }
+HRESULT CreateMarlixDLShellView(REFIID, void** ppv) { return NotAvailable(ppv); }
+HRESULT CreateMarlixDLEnumIDList(REFIID, void** ppv) { return NotAvailable(ppv); }
+HRESULT CreateMarlixDLExtractIcon(REFIID, void** ppv) { return NotAvailable(ppv); }
+HRESULT CreateMarlixDLDataObject(REFIID, void** ppv) { return NotAvailable(ppv); }
+HRESULT CreateMarlixDLQueryInfo(REFIID, void** ppv) { return NotAvailable(ppv); }
+HRESULT CreateMarlixDLDropTarget(REFIID, void** ppv) { return NotAvailable(ppv); }
+HRESULT CreateMarlixDLDropTargetOnListView(REFIID, void** ppv) { return NotAvailable(ppv); }

@@ -1,0 +1,26 @@
+# Generated resources of the module: the type library, compiled by widl from the IDL.
+find_program(MARLIX_WIDL widl NO_CMAKE_FIND_ROOT_PATH REQUIRED)
+find_path(MARLIX_WIDL_INCLUDE unknwn.idl PATHS /usr/include/wine/wine/windows /usr/include/wine/windows
+          NO_CMAKE_FIND_ROOT_PATH REQUIRED)
+
+set(MARLIX_TYPELIB ${MARLIX_GENERATED_DIR}/MarlixDLShellExt.tlb)
+add_custom_command(
+  OUTPUT ${MARLIX_TYPELIB}
+  COMMAND ${MARLIX_WIDL} --win64 -I${MARLIX_WIDL_INCLUDE} -t -o ${MARLIX_TYPELIB}
+          ${CMAKE_SOURCE_DIR}/server/MarlixDLShellExt.idl
+  DEPENDS ${CMAKE_SOURCE_DIR}/server/MarlixDLShellExt.idl
+  COMMENT "Type library MarlixDLShellExt.tlb"
+  VERBATIM)
+add_custom_target(marlix_typelib DEPENDS ${MARLIX_TYPELIB})
+# Every binary with module.rc links the core, so the type library exists before any of them.
+add_dependencies(marlix_core marlix_typelib)
+
+# Files that module.rc pulls in without #include, so that a change recompiles it.
+file(GLOB MARLIX_MODULE_RC_DEPENDS CONFIGURE_DEPENDS ${CMAKE_SOURCE_DIR}/server/*.rgs
+     ${CMAKE_SOURCE_DIR}/server/*.rc)
+list(APPEND MARLIX_MODULE_RC_DEPENDS ${MARLIX_TYPELIB})
+
+# Source properties are per directory: call this where a target compiles module.rc.
+function(marlix_module_rc_depends)
+  set_source_files_properties(${MARLIX_MODULE_RC} PROPERTIES OBJECT_DEPENDS "${MARLIX_MODULE_RC_DEPENDS}")
+endfunction()

@@ -1,0 +1,80 @@
+#include "server/server_module.h"
+
+#include <string>
+
+#include "server/class_factory.h"
+#include "server/class_ids.h"
+#include "server/registrar.h"
+#include "server/type_library.h"
+
+namespace {
+// The folder as the shell sees it from outside: SFGAO_FOLDER | SFGAO_HASSUBFOLDER.
+const BYTE kFolderAttributes[4] = {0x00, 0x00, 0x00, 0xA0};
+
+std::wstring ShellFolderKeyText() {
+  wchar_t clsid[40] = {};
+  StringFromGUID2(CLSID_MarlixDLShellFolder, clsid, 40);
+  return L"CLSID\\" + std::wstring(clsid) + L"\\ShellFolder";
+}
+}  // namespace
+
+void CServerModule::Init(std::span<const ObjectMapEntry> map, HMODULE module) noexcept {
+  map_ = map;
+  module_ = module;
+}
+
+void CServerModule::Term() noexcept {
+  map_ = {};
+  module_ = nullptr;
+}
+
+HRESULT CServerModule::GetClassObject(REFCLSID clsid, REFIID riid, void** ppv) const {
+  if (!ppv) return E_POINTER;
+  *ppv = nullptr;
+  const ObjectMapEntry* entry = FindObjectMapEntry(map_, clsid);
+  if (!entry) return CLASS_E_CLASSNOTAVAILABLE;
+  auto factory = com::Make<CClassFactory>(entry->create);
+  if (!factory) return E_OUTOFMEMORY;
+  return factory->QueryInterface(riid, ppv);
+}
+
+HRESULT CServerModule::CanUnloadNow() const noexcept { return com::ModuleLockCount() == 0 ? S_OK : S_FALSE; }
+
+HRESULT CServerModule::RegisterServer() const {
+  if (!module_) return E_UNEXPECTED;
+  // The classes register no component categories, so each entry is its script alone.
+  for (const auto& entry : map_)
+    if (HRESULT hr = RunRegistryResource(module_, entry.script, true); FAILED(hr)) return hr;
+  HRESULT hr = RegisterModuleTypeLib(module_);
+  if (FAILED(hr)) return hr;
+
+  HKEY key = nullptr;
+  if (RegCreateKeyExW(HKEY_CLASSES_ROOT, ShellFolderKeyText().c_str(), 0, nullptr, 0, KEY_WRITE, nullptr, &key,
+                      nullptr) == ERROR_SUCCESS) {
+    RegSetValueExW(key, L"Attributes", 0, REG_BINARY, kFolderAttributes, sizeof(kFolderAttributes));
+    RegCloseKey(key);
+  }
+  return hr;
+}
+
+HRESULT CServerModule::UnregisterServer() const {
+  if (module_) {
+    bool failed = false;
+    for (const auto& entry : map_)
+      if (FAILED(RunRegistryResource(module_, entry.script, false))) {
+        failed = true;
+        break;
+      }
+    if (!failed) UnregisterModuleTypeLib(module_);
+  }
+  std::wstring keyText = ShellFolderKeyText();
+  // A value name with a path in it names nothing; this first removal never finds
+  // anything and stays for compatibility with what earlier versions did.
+  RegDeleteValueW(HKEY_CLASSES_ROOT, (keyText + L"\\Attributes").c_str());
+  HKEY key = nullptr;
+  if (RegOpenKeyExW(HKEY_CLASSES_ROOT, keyText.c_str(), 0, KEY_WRITE, &key) == ERROR_SUCCESS) {
+    RegDeleteValueW(key, L"Attributes");
+    RegCloseKey(key);
+  }
+  return S_OK;
+}

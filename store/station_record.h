@@ -1,0 +1,56 @@
+// The level record and the per-user registry store of levels.
+#pragma once
+#include <windows.h>
+#include <string>
+#include <vector>
+
+// One digital level: a user's name on a set of serial-line settings. A plain value.
+class CStationRecord {
+ public:
+  CStationRecord();
+
+  std::wstring Name;
+  int Port = 1;
+  int BaudRate = 9600;
+  int StopBits = 1;  // 1, 2, or 15 for one and a half
+  int Parity = 0;    // 0 none, 1 even, 2 odd
+  int DataBits = 8;
+  int Flow = 0;      // 0 none, 1 Xon/Xoff
+  int CheckSum = 1;  // 0 not set, 1 set
+  std::wstring Manufacturer;  // the user's note
+  std::wstring Model;
+};
+
+// Widths of the view's two columns, read at module start and written at module end.
+extern int ColumnWidths[2];
+
+std::wstring GetBaseKeyName();
+std::wstring GetLevelsKeyName();
+
+// True if the stored "Display Settings" were read; the widths are 100 otherwise.
+bool LoadDisplaySettings();
+bool SaveDisplaySettings();
+
+// 0, or the code of the first value that could not be read; fields not reached keep their contents.
+LONG ReadStation(CStationRecord& record, HKEY key);
+// Stops silently at the first value that cannot be written.
+void WriteStation(const CStationRecord& record, HKEY key);
+
+// Finds a level by exact name and fills `record` from the store. With a buffer and a
+// non-zero *keyNameLength, also gives the level's key name and sets the length to its length + 1.
+HRESULT FindStation(CStationRecord& record, wchar_t* keyName = nullptr, DWORD* keyNameLength = nullptr);
+// E_INVALIDARG if the name is taken, in which case `record` now holds the stored level.
+HRESULT AddStation(CStationRecord& record);
+HRESULT UpdateStation(const std::wstring& oldName, const CStationRecord& record);
+HRESULT DeleteStation(const CStationRecord& record);
+// The base, or the base with " (2)", " (3)", ... : the first name no level has.
+std::wstring MakeUniqueStationName(const std::wstring& base);
+
+// Deletes a key and everything below it. ERROR_BADKEY for an empty name.
+LONG DeleteKeyTree(HKEY parent, const wchar_t* name);
+
+// The clipboard form "Marlix Total Stations": a count, then a size and a packed record each.
+// The handle is global memory (0x2042) owned by the caller; null if it could not be made.
+HGLOBAL PackStations(const std::vector<CStationRecord>& records);
+// Appends the records found in the block; stops at the first damaged one. Returns 0.
+HRESULT UnpackStations(HGLOBAL block, std::vector<CStationRecord>& records);

@@ -1,0 +1,10 @@
+// The one way to a user-visible text: the module's English string table, then translation.
+#pragma once
+#include <windows.h>
+#include <string>
+
+// The text of string `id` in the calling thread's language; empty if the table has no such entry.
+std::wstring LoadTranslatedString(UINT id);
+
+// The text before the first "#$" marker; the tail behind it only tells twin sentences apart.
+std::wstring CutAtTailMarker(const std::wstring& text);

@@ -2,6 +2,7 @@
 
 #include "server/class_ids.h"
 #include "server/module_instance.h"
+#include "store/station_record.h"
 
 namespace {
 CModuleApp theApp;
@@ -16,10 +17,12 @@ BOOL CModuleApp::InitInstance() {
   server_.Init(ModuleObjectMap(), ModuleInstance());
   if (!CAppBase::InitInstance()) return FALSE;
   resource_ = ModuleInstance();
+  LoadDisplaySettings();
   return TRUE;
 }
 
 int CModuleApp::ExitInstance() {
+  SaveDisplaySettings();
   server_.Term();
   return CAppBase::ExitInstance();
 }

@@ -74,3 +74,26 @@ TEST_F(DllExports, LockServerHoldsTheModule) {
 }
 
 }  // namespace
+
+namespace {
+
+TEST(DllLifetime, ColumnWidthsAreReadAtLoadAndWrittenBackAtUnload) {
+  RegistrySandbox sandbox;
+  const std::wstring base = L"Software\\Gravon\\Shell Extensions\\Marlix DL View";
+  const int32_t seeded[4] = {140, 260, 7, 9};
+  RegSetKeyValueW(HKEY_CURRENT_USER, base.c_str(), L"Display Settings", REG_BINARY, seeded, sizeof(seeded));
+  {
+    LoadedDll dll;
+    ASSERT_TRUE(dll.module);
+    RegDeleteKeyValueW(HKEY_CURRENT_USER, base.c_str(), L"Display Settings");
+  }
+  int32_t saved[4] = {};
+  DWORD size = sizeof(saved);
+  ASSERT_EQ(RegGetValueW(HKEY_CURRENT_USER, base.c_str(), L"Display Settings", RRF_RT_REG_BINARY, nullptr, saved,
+                         &size), ERROR_SUCCESS);
+  EXPECT_EQ(size, 12u);
+  EXPECT_EQ(saved[0], 140);
+  EXPECT_EQ(saved[1], 260);
+}
+
+}  // namespace

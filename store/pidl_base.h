@@ -2,6 +2,7 @@
 #pragma once
 #include <windows.h>
 #include <shlobj.h>
+#include <cstddef>
 #include <cstdint>
 #include <cstring>
 
@@ -20,6 +21,7 @@ struct tagPIDLDATA {
   wchar_t text[1];  // NUL-terminated, followed by 5 unused bytes
 };
 #pragma pack(pop)
+static_assert(offsetof(tagPIDLDATA, text) == 12, "text lies at offset 14 of an id");
 
 // Operations that know nothing of an id beyond its cb. All accept a null list.
 // Every list made here comes from the shell's task allocator and is the caller's to Free.

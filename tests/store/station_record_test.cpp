@@ -192,6 +192,25 @@ TEST(StationStore, NamesAtAndPastTheReadLimit) {
   ASSERT_EQ(AddStation(twice), S_OK);
   EXPECT_TRUE(RegKeyExists(kUser, LevelPath(2)));
 
+  // A level key that refuses full access is passed over like a foreign one.
+  RegWriteString(kUser, LevelPath(5), L"Name", L"locked");
+  win::UniqueHKey locked;
+  ASSERT_EQ(RegOpenKeyExW(kUser, LevelPath(5).c_str(), 0, KEY_ALL_ACCESS, locked.Put()), ERROR_SUCCESS);
+  SECURITY_DESCRIPTOR sd;
+  InitializeSecurityDescriptor(&sd, SECURITY_DESCRIPTOR_REVISION);
+  BYTE aclBytes[128];
+  auto* acl = reinterpret_cast<ACL*>(aclBytes);
+  InitializeAcl(acl, sizeof(aclBytes), ACL_REVISION);
+  BYTE everyone[SECURITY_MAX_SID_SIZE];
+  DWORD sidSize = sizeof(everyone);
+  CreateWellKnownSid(WinWorldSid, nullptr, everyone, &sidSize);
+  AddAccessDeniedAce(acl, ACL_REVISION, KEY_SET_VALUE, everyone);
+  AddAccessAllowedAce(acl, ACL_REVISION, KEY_ALL_ACCESS & ~KEY_SET_VALUE, everyone);
+  SetSecurityDescriptorDacl(&sd, TRUE, acl, FALSE);
+  ASSERT_EQ(RegSetKeySecurity(locked.Get(), DACL_SECURITY_INFORMATION, &sd), ERROR_SUCCESS);
+  CStationRecord lockedLevel = Named(L"locked");
+  EXPECT_EQ(FindStation(lockedLevel), E_FAIL);
+
   // Exactly 520 bytes with no terminator, and an odd size, still end inside the buffer.
   std::wstring full(260, L'd');
   WriteRaw(LevelPath(10), L"Name", REG_BINARY, full.data(), 520);

@@ -64,12 +64,11 @@ TEST_F(DllExports, LockServerHoldsTheModule) {
   com::ComPtr<IClassFactory> factory;
   ASSERT_EQ(dll_.getClassObject(CLSID_MarlixDLQueryInfo, IID_IClassFactory, factory.PutVoid()), S_OK);
   EXPECT_EQ(factory->LockServer(TRUE), S_OK);
-  factory->AddRef();
-  IClassFactory* raw = factory.Detach();
-  raw->Release();
-  EXPECT_EQ(dll_.canUnloadNow(), S_FALSE);
-  EXPECT_EQ(raw->LockServer(FALSE), S_OK);
-  EXPECT_EQ(raw->Release(), 0u);
+  factory.Reset();
+  EXPECT_EQ(dll_.canUnloadNow(), S_FALSE) << "the lock outlives the class object";
+  ASSERT_EQ(dll_.getClassObject(CLSID_MarlixDLDropTarget, IID_IClassFactory, factory.PutVoid()), S_OK);
+  EXPECT_EQ(factory->LockServer(FALSE), S_OK);
+  factory.Reset();
   EXPECT_EQ(dll_.canUnloadNow(), S_OK);
 }
 

@@ -29,16 +29,12 @@ regsvr /u    # nothing registered: still S_OK
 expect_no_key "$folder"
 
 regsvr
-expect_line "folder name" "REG_SZ    Marlix Digital Levels" "$folder" /ve
-expect_line "info tip" "Allows you to read files from Marlix Digital Levels" "$folder" /v InfoTip
-expect_line "icon" "$dll,0" "$folder\\DefaultIcon" /ve
 expect_line "server" "$dll" "$folder\\InprocServer32" /ve
-expect_line "threading" "Apartment" "$folder\\InprocServer32" /v ThreadingModel
+expect_line "icon" "$dll,0" "$folder\\DefaultIcon" /ve
 expect_line "attributes" "Attributes    REG_BINARY    000000A0" "$folder\\ShellFolder" /v Attributes
 expect_line "namespace" "Marlix Digital Levels" "$namespace\\{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}" /ve
 expect_line "approved" "Marlix Digital Levels" "$approved" /v "{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}"
-expect_line "progid" "MarlixDLShellExt.MarlixDLShellView.1" 'HKCR\MarlixDLShellExt.MarlixDLShellView\CurVer' /ve
-expect_line "view progid" "MarlixDLShellExt.MarlixDLShellView.1" "$view\\ProgID" /ve
+expect_line "progid" "MarlixDLShellExt.MarlixDLShellView.1" "$view\\ProgID" /ve
 expect_key 'HKCR\TypeLib\{1C83F5C4-5B89-4449-87FF-E494222081A6}\1.0'
 
 # A second registration replaces the class keys and writes Attributes anew.
@@ -50,7 +46,6 @@ expect_line "attributes again" "000000A0" "$folder\\ShellFolder" /v Attributes
 regsvr /u
 expect_no_key "$folder"
 expect_no_key "$view"
-expect_no_key 'HKCR\MarlixDLShellExt.MarlixDLShellView'
 expect_no_key "$namespace\\{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}"
 expect_key "$namespace"
 expect_key "$approved"
@@ -60,7 +55,7 @@ expect_line "level after unregistering" "Station 0" "$level" /v Name
 regsvr
 expect_line "level after registering again" "Station 0" "$level" /v Name
 regsvr /u
-"$run" reg delete 'HKCU\Software\Gravon' /f >/dev/null 2>&1
+"$run" reg delete "$level" /f >/dev/null 2>&1
 
 if [ "$failures" -ne 0 ]; then echo "$failures failed"; exit 1; fi
 echo "regsvr32 registration: all checks passed"

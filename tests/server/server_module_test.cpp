@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "server/class_creators.h"
@@ -57,36 +58,33 @@ class ServerModule : public testing::Test {
 
 TEST_F(ServerModule, RegistrationWritesTheTables) {
   ASSERT_EQ(server_.RegisterServer(), S_OK);
-
-  EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, kFolderKey, nullptr), L"Marlix Digital Levels");
-  EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, kFolderKey, L"InfoTip"),
-            L"Allows you to read files from Marlix Digital Levels");
-  EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, kFolderKey + L"\\DefaultIcon", nullptr), module_ + L",0");
-  EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, kFolderKey + L"\\InprocServer32", nullptr), module_);
-  EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, kFolderKey + L"\\InprocServer32", L"ThreadingModel"), L"Apartment");
-  EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, kFolderKey + L"\\TypeLib", nullptr),
-            L"{1C83F5C4-5B89-4449-87FF-E494222081A6}");
+  const std::wstring libid = L"{1C83F5C4-5B89-4449-87FF-E494222081A6}";
+  struct { HKEY root; std::wstring key; const wchar_t* value; std::wstring expected; } folder[] = {
+      {HKEY_CLASSES_ROOT, kFolderKey, nullptr, L"Marlix Digital Levels"},
+      {HKEY_CLASSES_ROOT, kFolderKey, L"InfoTip", L"Allows you to read files from Marlix Digital Levels"},
+      {HKEY_CLASSES_ROOT, kFolderKey + L"\\DefaultIcon", nullptr, module_ + L",0"},
+      {HKEY_CLASSES_ROOT, kFolderKey + L"\\InprocServer32", nullptr, module_},
+      {HKEY_CLASSES_ROOT, kFolderKey + L"\\InprocServer32", L"ThreadingModel", L"Apartment"},
+      {HKEY_CLASSES_ROOT, kFolderKey + L"\\TypeLib", nullptr, libid},
+      {HKEY_LOCAL_MACHINE, kApproved, kFolderGuid.c_str(), L"Marlix Digital Levels"},
+      {HKEY_LOCAL_MACHINE, kNameSpace + L"\\" + kFolderGuid, nullptr, L"Marlix Digital Levels"},
+  };
+  for (const auto& v : folder) EXPECT_EQ(RegReadString(v.root, v.key, v.value), v.expected) << v.key.c_str();
   EXPECT_EQ(ReadAttributes(), kAttributes);
   EXPECT_FALSE(RegKeyExists(HKEY_CLASSES_ROOT, L"MarlixDLShellExt.MarlixDLShellFolder"));
-  EXPECT_EQ(RegReadString(HKEY_LOCAL_MACHINE, kApproved, kFolderGuid.c_str()), L"Marlix Digital Levels");
-  EXPECT_EQ(RegReadString(HKEY_LOCAL_MACHINE, kNameSpace + L"\\" + kFolderGuid, nullptr), L"Marlix Digital Levels");
   EXPECT_TRUE(RegKeyExists(HKEY_CLASSES_ROOT, kTypeLibKey + L"\\1.0"));
 
   for (const auto& c : kProgIdClasses) {
-    SCOPED_TRACE(testing::PrintToString(c.name));
-    std::wstring name = c.name, progId = L"MarlixDLShellExt." + name, clsidKey = L"CLSID\\" + std::wstring(c.clsid);
-    EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, progId + L".1", nullptr), name + L" Class");
-    EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, progId + L".1\\CLSID", nullptr), c.clsid);
-    EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, progId, nullptr), name + L" Class");
-    EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, progId + L"\\CLSID", nullptr), c.clsid);
-    EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, progId + L"\\CurVer", nullptr), progId + L".1");
-    EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, clsidKey, nullptr), name + L" Class");
-    EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, clsidKey + L"\\ProgID", nullptr), progId + L".1");
-    EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, clsidKey + L"\\VersionIndependentProgID", nullptr), progId);
-    EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, clsidKey + L"\\InprocServer32", nullptr), module_);
-    EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, clsidKey + L"\\InprocServer32", L"ThreadingModel"), L"Apartment");
-    EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, clsidKey + L"\\TypeLib", nullptr),
-              L"{1C83F5C4-5B89-4449-87FF-E494222081A6}");
+    std::wstring name = c.name, progId = L"MarlixDLShellExt." + name, key = L"CLSID\\" + std::wstring(c.clsid);
+    std::pair<std::wstring, std::wstring> values[] = {
+        {progId + L".1", name + L" Class"},       {progId + L".1\\CLSID", c.clsid},
+        {progId, name + L" Class"},               {progId + L"\\CLSID", c.clsid},
+        {progId + L"\\CurVer", progId + L".1"}, {key, name + L" Class"},
+        {key + L"\\ProgID", progId + L".1"},    {key + L"\\VersionIndependentProgID", progId},
+        {key + L"\\InprocServer32", module_},   {key + L"\\TypeLib", libid},
+    };
+    for (const auto& [path, expected] : values) EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, path, nullptr), expected);
+    EXPECT_EQ(RegReadString(HKEY_CLASSES_ROOT, key + L"\\InprocServer32", L"ThreadingModel"), L"Apartment");
   }
 }
 

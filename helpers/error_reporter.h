@@ -1,0 +1,47 @@
+// Failure codes as sentences: a process-wide chain of reporters asked in the order
+// they were built, and a numeric fallback that always prints something.
+#pragma once
+#include <windows.h>
+#include <string>
+
+namespace kld::ft {
+
+// Registers itself on construction and leaves the list on destruction. Reporters are
+// never deleted through a base pointer, hence no virtual destructor.
+class TErrorReporter {
+ public:
+  TErrorReporter() noexcept;
+  ~TErrorReporter();
+  TErrorReporter(const TErrorReporter&) = delete;
+  TErrorReporter& operator=(const TErrorReporter&) = delete;
+
+  // Empty when this reporter doesn't know the code. The texts may be null.
+  virtual std::wstring GetErrorText(HRESULT code, const wchar_t* text1, const wchar_t* text2,
+                                    const wchar_t* text3) const;
+};
+
+// System and component codes, through the module's code table or the system's messages.
+class TStdErrorReporter final : public TErrorReporter {
+ public:
+  std::wstring GetErrorText(HRESULT code, const wchar_t* text1, const wchar_t* text2,
+                            const wchar_t* text3) const override;
+  // The string id of a code in the table, or 0.
+  static UINT StringIdOf(HRESULT code) noexcept;
+};
+
+// Codes of the internet library, when that library is already in the process.
+class TInternetErrorReporter final : public TErrorReporter {
+ public:
+  std::wstring GetErrorText(HRESULT code, const wchar_t* text1, const wchar_t* text2,
+                            const wchar_t* text3) const override;
+};
+
+// Never empty unless memory ran out.
+std::wstring BuildErrorText(HRESULT code, const wchar_t* text1 = nullptr,
+                            const wchar_t* text2 = nullptr, const wchar_t* text3 = nullptr);
+
+// The reporters in the order they are asked (for inspection).
+size_t ErrorReporterCount() noexcept;
+const TErrorReporter* ErrorReporterAt(size_t index) noexcept;
+
+}  // namespace kld::ft

@@ -1,0 +1,253 @@
+#include "transfer/data_object.h"
+
+#include <new>
+#include <string>
+
+#include "helpers/win_handles.h"
+#include "server/class_creators.h"
+#include "store/pidl_manager.h"
+#include "store/station_record.h"
+#include "transfer/enum_format_etc.h"
+#include "transfer/stream2.h"
+
+namespace {
+
+constexpr UINT kClipboardFlags = GMEM_MOVEABLE | GMEM_ZEROINIT | GMEM_SHARE;  // 0x2042
+constexpr wchar_t kVirtualFileName[] = L"file1.tkf";
+
+// Registered anew at each use; the request carries the 16-bit number.
+CLIPFORMAT Format(const wchar_t* name) noexcept {
+  return static_cast<CLIPFORMAT>(RegisterClipboardFormatW(name));
+}
+CLIPFORMAT FileContentsFormat() noexcept { return Format(L"FileContents"); }
+CLIPFORMAT GroupDescriptorFormat() noexcept { return Format(L"FileGroupDescriptorW"); }
+CLIPFORMAT IdListArrayFormat() noexcept { return Format(L"Shell IDList Array"); }
+CLIPFORMAT DropEffectFormat() noexcept { return Format(L"Preferred DropEffect"); }
+CLIPFORMAT StationsFormat() noexcept { return Format(L"Marlix Total Stations"); }
+
+bool IsStreamRequest(const FORMATETC& f, CLIPFORMAT cf) noexcept {
+  return f.cfFormat == cf && (f.tymed & TYMED_ISTREAM) != 0;
+}
+bool IsGlobalRequest(const FORMATETC& f, CLIPFORMAT cf) noexcept {
+  return f.cfFormat == cf && f.tymed == TYMED_HGLOBAL;
+}
+
+// No second transfer may start while a transfer dialog runs on any thread.
+bool TransferDialogOpen() noexcept { return false; }
+
+void HandOver(STGMEDIUM& medium, HGLOBAL block) noexcept {
+  medium.tymed = TYMED_HGLOBAL;
+  medium.hGlobal = block;
+  medium.pUnkForRelease = nullptr;
+}
+
+}  // namespace
+
+CMarlixDLDataObject::~CMarlixDLDataObject() {
+  CPidlMgr pidl;
+  for (LPITEMIDLIST item : ItemList) pidl.Free(item);
+  // A drag that never reached QueryContinueDrag's clean-up still owes its picture.
+  if (DragImage) ImageList_Destroy(DragImage);
+}
+
+void CMarlixDLDataObject::AddItem(LPCITEMIDLIST list) {
+  CPidlMgr pidl;
+  if (LPITEMIDLIST copy = pidl.Copy(list)) ItemList.push_back(copy);
+}
+
+void CMarlixDLDataObject::SetDragImage(HIMAGELIST image, HWND window, POINT hotSpot) noexcept {
+  DragImage = image;
+  DragWindow = window;
+  DragHotSpot = hotSpot;
+}
+
+STDMETHODIMP CMarlixDLDataObject::GetData(FORMATETC* format, STGMEDIUM* medium) {
+  if (!format || !medium) return E_INVALIDARG;
+  if (TransferDialogOpen()) return E_INVALIDARG;
+  const FORMATETC& f = *format;
+  if (IsGlobalRequest(f, DropEffectFormat())) return GetDropEffect(*medium);
+  if (IsGlobalRequest(f, GroupDescriptorFormat())) return GetGroupDescriptor(*medium);
+  if (IsStreamRequest(f, FileContentsFormat())) return GetFileContents(f.lindex, *medium);
+  if (IsGlobalRequest(f, IdListArrayFormat())) return GetIdListArray(*medium);
+  if (IsGlobalRequest(f, StationsFormat())) return GetStations(*medium);
+  return E_INVALIDARG;
+}
+
+HRESULT CMarlixDLDataObject::GetDropEffect(STGMEDIUM& medium) {
+  HGLOBAL block = GlobalAlloc(kClipboardFlags, sizeof(DWORD));
+  if (!block) return E_OUTOFMEMORY;
+  {
+    win::GlobalLockGuard<DWORD> lock(block);
+    *lock.Get() = DROPEFFECT_COPY;
+  }
+  HandOver(medium, block);
+  return S_OK;
+}
+
+HRESULT CMarlixDLDataObject::GetGroupDescriptor(STGMEDIUM& medium) {
+  static_assert(sizeof(FILEDESCRIPTORW) == 592);
+  if (ItemList.empty()) return S_FALSE;
+  const size_t n = ItemList.size();
+  HGLOBAL block = GlobalAlloc(kClipboardFlags, sizeof(UINT) + sizeof(FILEDESCRIPTORW) * n);
+  if (!block) return E_OUTOFMEMORY;
+  {
+    win::GlobalLockGuard<FILEGROUPDESCRIPTORW> lock(block);
+    FILEGROUPDESCRIPTORW* group = lock.Get();
+    group->cItems = static_cast<UINT>(n);
+    // Name only: the receiver learns no size, time or attributes.
+    for (size_t i = 0; i < n; ++i) wcscpy_s(group->fgd[i].cFileName, kVirtualFileName);
+  }
+  HandOver(medium, block);
+  return S_OK;
+}
+
+HRESULT CMarlixDLDataObject::GetFileContents(LONG index, STGMEDIUM& /*medium*/) {
+  if (ItemList.empty()) return S_FALSE;
+  if (index < 0 || static_cast<size_t>(index) >= ItemList.size()) return S_FALSE;
+  LPCITEMIDLIST item = ItemList[static_cast<size_t>(index)];
+  CPidlMgr pidl;
+  if (!pidl.IsFile(item)) return S_FALSE;
+
+  wchar_t path[260] = {};
+  pidl.GetPath(item, path, 260);
+  CStationRecord level;
+  level.Name = PathComponent(path, 1);
+  if (HRESULT hr = FindStation(level); hr != 0) return hr;
+
+  return S_FALSE;
+}
+
+HRESULT CMarlixDLDataObject::GetIdListArray(STGMEDIUM& medium) {
+  if (ItemList.empty()) return S_FALSE;
+  CPidlMgr pidl;
+  LPITEMIDLIST parent = pidl.CopyParent(ItemList.front());
+  if (!parent) return S_FALSE;
+
+  const size_t n = ItemList.size();
+  const UINT tableEnd = static_cast<UINT>(4 * n + 8);
+  SIZE_T size = tableEnd + pidl.GetSize(parent);
+  for (LPCITEMIDLIST item : ItemList) size += pidl.GetSize(pidl.GetLast(item));
+
+  HGLOBAL block = GlobalAlloc(kClipboardFlags, size);
+  if (block) {
+    win::GlobalLockGuard<BYTE> lock(block);
+    BYTE* base = lock.Get();
+    auto* cida = reinterpret_cast<CIDA*>(base);
+    cida->cidl = static_cast<UINT>(n);
+    UINT offset = tableEnd;
+    cida->aoffset[0] = offset;
+    UINT parentSize = pidl.GetSize(parent);
+    memcpy(base + offset, parent, parentSize);
+    offset += parentSize;
+    for (size_t i = 0; i < n; ++i) {
+      LPCITEMIDLIST child = pidl.GetLast(ItemList[i]);
+      UINT childSize = pidl.GetSize(child);
+      cida->aoffset[i + 1] = offset;
+      memcpy(base + offset, child, childSize);
+      offset += childSize;
+    }
+  }
+  pidl.Free(parent);
+  if (!block) return E_OUTOFMEMORY;
+  HandOver(medium, block);
+  return S_OK;
+}
+
+HRESULT CMarlixDLDataObject::GetStations(STGMEDIUM& medium) {
+  CPidlMgr pidl;
+  std::vector<CStationRecord> found;
+  for (LPCITEMIDLIST item : ItemList) {
+    wchar_t path[260] = {};
+    pidl.GetPath(item, path, 260);
+    CStationRecord level;
+    level.Name = PathComponent(path, 1);
+    // A level gone meanwhile is left out silently.
+    if (FindStation(level) == 0) found.push_back(level);
+  }
+  HGLOBAL block = PackStations(found);
+  if (!block) return E_OUTOFMEMORY;
+  HandOver(medium, block);
+  return S_OK;
+}
+
+STDMETHODIMP CMarlixDLDataObject::GetDataHere(FORMATETC*, STGMEDIUM*) { return E_NOTIMPL; }
+
+STDMETHODIMP CMarlixDLDataObject::QueryGetData(FORMATETC* format) {
+  if (!format) return E_INVALIDARG;
+  if (TransferDialogOpen()) return E_INVALIDARG;
+  const FORMATETC& f = *format;
+  if (IsStreamRequest(f, FileContentsFormat()) || IsGlobalRequest(f, GroupDescriptorFormat()) ||
+      IsGlobalRequest(f, IdListArrayFormat()) || IsGlobalRequest(f, DropEffectFormat()) ||
+      IsGlobalRequest(f, StationsFormat())) {
+    return S_OK;
+  }
+  return S_FALSE;
+}
+
+STDMETHODIMP CMarlixDLDataObject::GetCanonicalFormatEtc(FORMATETC*, FORMATETC*) { return E_NOTIMPL; }
+
+// Accepted and forgotten: the medium stays the caller's.
+STDMETHODIMP CMarlixDLDataObject::SetData(FORMATETC*, STGMEDIUM*, BOOL) { return S_OK; }
+
+STDMETHODIMP CMarlixDLDataObject::EnumFormatEtc(DWORD, IEnumFORMATETC** result) {
+  if (!result) return E_POINTER;
+  *result = nullptr;
+  // "Preferred DropEffect" is answered on request but deliberately not listed.
+  const FORMATETC formats[4] = {
+      {FileContentsFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_ISTREAM},
+      {GroupDescriptorFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL},
+      {IdListArrayFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL},
+      {StationsFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL},
+  };
+  CEnumFormatEtc* list = CEnumFormatEtc::Create(formats, 4);
+  if (!list) return E_OUTOFMEMORY;
+  *result = list;
+  return S_OK;
+}
+
+STDMETHODIMP CMarlixDLDataObject::DAdvise(FORMATETC*, DWORD, IAdviseSink*, DWORD*) { return E_NOTIMPL; }
+STDMETHODIMP CMarlixDLDataObject::DUnadvise(DWORD) { return E_NOTIMPL; }
+STDMETHODIMP CMarlixDLDataObject::EnumDAdvise(IEnumSTATDATA**) { return E_NOTIMPL; }
+
+STDMETHODIMP CMarlixDLDataObject::QueryContinueDrag(BOOL escapePressed, DWORD keyState) {
+  // The picture goes only when nothing at all is held any more.
+  if (keyState == 0) {
+    ImageList_EndDrag();
+    ImageList_DragLeave(DragWindow);
+    ImageList_Destroy(DragImage);
+    DragImage = nullptr;
+    DragImageShown = FALSE;
+  }
+  if (escapePressed) return DRAGDROP_S_CANCEL;
+  if (keyState & MK_LBUTTON) return S_OK;
+  return DRAGDROP_S_DROP;
+}
+
+STDMETHODIMP CMarlixDLDataObject::GiveFeedback(DWORD) {
+  if (!DragImage) return DRAGDROP_S_USEDEFAULTCURSORS;
+  if (!DragImageShown) {
+    ImageList_DragEnter(DragWindow, 0, 0);
+    ImageList_BeginDrag(DragImage, 0, 0, 0);
+    DragImageShown = TRUE;
+    return DRAGDROP_S_USEDEFAULTCURSORS;
+  }
+  POINT cursor;
+  if (!GetCursorPos(&cursor)) return DRAGDROP_S_USEDEFAULTCURSORS;
+  // The picture shows only over the source list.
+  HWND under = WindowFromPoint(cursor);
+  if (under != DragWindow && !IsChild(DragWindow, under)) {
+    ImageList_DragShowNolock(FALSE);
+  } else {
+    ImageList_DragMove(cursor.x + DragHotSpot.x, cursor.y + DragHotSpot.y);
+    ImageList_DragShowNolock(TRUE);
+  }
+  return DRAGDROP_S_USEDEFAULTCURSORS;
+}
+
+HRESULT CreateMarlixDLDataObject(REFIID riid, void** ppv) {
+  if (!ppv) return E_POINTER;
+  *ppv = nullptr;
+  auto object = com::Make<CMarlixDLDataObject>();
+  if (!object) return E_OUTOFMEMORY;
+  return object->QueryInterface(riid, ppv);
+}

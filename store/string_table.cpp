@@ -1,5 +1,6 @@
 #include "store/string_table.h"
 
+#include "helpers/translate_manager.h"
 #include "server/module_instance.h"
 
 namespace {
@@ -27,10 +28,9 @@ std::wstring LoadEnglishEntry(UINT id) {
   return std::wstring(block + pos + 1, length);
 }
 
-// Stands where translation files are consulted; without one, the text is only cut.
+// Translation files are keyed by the English text; without one, the text is only cut.
 std::wstring TranslateTableText(const std::wstring& text, LANGID threadLanguage) {
-  (void)threadLanguage;
-  return CutAtTailMarker(text);
+  return kld::ft::TranslateText(text, 1033, threadLanguage, ModuleInstance(), nullptr);
 }
 
 }  // namespace

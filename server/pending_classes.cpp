@@ -9,10 +9,6 @@ HRESULT NotAvailable(void** ppv) {
 }
 }  // namespace
 
-HRESULT CreateMarlixDLShellFolder(REFIID, void** ppv) { return NotAvailable(ppv); }
 HRESULT CreateMarlixDLShellView(REFIID, void** ppv) { return NotAvailable(ppv); }
-HRESULT CreateMarlixDLEnumIDList(REFIID, void** ppv) { return NotAvailable(ppv); }
-HRESULT CreateMarlixDLExtractIcon(REFIID, void** ppv) { return NotAvailable(ppv); }
-HRESULT CreateMarlixDLQueryInfo(REFIID, void** ppv) { return NotAvailable(ppv); }
 HRESULT CreateMarlixDLDropTarget(REFIID, void** ppv) { return NotAvailable(ppv); }
 HRESULT CreateMarlixDLDropTargetOnListView(REFIID, void** ppv) { return NotAvailable(ppv); }

@@ -1,0 +1,52 @@
+#include "shell/extract_icon.h"
+
+#include <new>
+
+#include "server/class_creators.h"
+#include "shell/item_services.h"
+
+CMarlixDLExtractIcon::CMarlixDLExtractIcon() : m_pidlMgr(new (std::nothrow) CPidlMgr) {}
+
+CMarlixDLExtractIcon::~CMarlixDLExtractIcon() {
+  if (m_pidlMgr) m_pidlMgr->Free(m_list);
+}
+
+bool CMarlixDLExtractIcon::SetItem(LPCITEMIDLIST fullList) {
+  if (!m_pidlMgr) return false;
+  LPITEMIDLIST copy = m_pidlMgr->Copy(fullList);
+  if (fullList && !copy) return false;
+  m_pidlMgr->Free(m_list);
+  m_list = copy;
+  return true;
+}
+
+// The index is the shell's cache key together with GIL_NOTFILENAME: no file is named.
+STDMETHODIMP CMarlixDLExtractIcon::GetIconLocation(UINT, LPWSTR, UINT, int* index, UINT* outFlags) {
+  if (outFlags) *outFlags = GIL_NOTFILENAME;
+  int image = IMAGE_ADD_LEVEL;
+  LPCITEMIDLIST last = m_pidlMgr ? m_pidlMgr->GetLast(m_list) : nullptr;
+  if (!last && m_list && IdSize(m_list) != 0) last = m_list;
+  if (last) {
+    switch (CPidlMgr::GetType(last)) {
+      case PIDL_LEVEL: image = IMAGE_LEVEL; break;
+      case PIDL_FILE: image = IMAGE_VIRTUAL_FILE; break;
+      default: break;
+    }
+  }
+  if (index) *index = image;
+  return S_OK;
+}
+
+STDMETHODIMP CMarlixDLExtractIcon::Extract(LPCWSTR, UINT index, HICON* large, HICON* small, UINT) {
+  if (large) *large = ImageList_GetIcon(LargeImageList, static_cast<int>(index), ILD_TRANSPARENT);
+  if (small) *small = ImageList_GetIcon(SmallImageList, static_cast<int>(index), ILD_TRANSPARENT);
+  return S_OK;
+}
+
+HRESULT CreateMarlixDLExtractIcon(REFIID riid, void** ppv) {
+  if (!ppv) return E_POINTER;
+  *ppv = nullptr;
+  auto icon = com::Make<CMarlixDLExtractIcon>();
+  if (!icon || !icon->IsUsable()) return E_OUTOFMEMORY;
+  return icon->QueryInterface(riid, ppv);
+}

@@ -1,0 +1,50 @@
+// The brand-neutral part of a namespace folder: its position and every answer that
+// needs no concrete class.
+#pragma once
+#include <windows.h>
+#include <shlobj.h>
+
+#include <memory>
+
+#include "server/com_base.h"
+#include "store/pidl_base.h"
+
+class CGravonShellFolderBase : public com::ComObject<IShellFolder, IPersistFolder> {
+ public:
+  // Takes ownership of the manager (null if it could not be made).
+  explicit CGravonShellFolderBase(CGravonPidlManagerBase* pidlMgr);
+  ~CGravonShellFolderBase() override;
+
+  // The folder's address. Plain: the parent's address, a backslash and this folder's
+  // text, so it starts with a backslash. Parsing: at the root the root's parsing
+  // name, below it that and the level's text. False if it doesn't fit `size`.
+  bool GetFolderPath(wchar_t* destination, UINT size, bool parsing) const;
+  // Positions the folder under `parent` (null at the root) at `list` (null: the root).
+  HRESULT Init(CGravonShellFolderBase* parent, LPCITEMIDLIST list);
+  // False if the object could not get its allocator or list manager.
+  bool IsUsable() const noexcept { return m_pidlMgr && m_malloc; }
+
+  // IShellFolder
+  STDMETHODIMP ParseDisplayName(HWND window, IBindCtx* context, LPWSTR name, ULONG* eaten,
+                                PIDLIST_RELATIVE* result, ULONG* attributes) override;
+  STDMETHODIMP BindToStorage(PCUIDLIST_RELATIVE list, IBindCtx* context, REFIID riid, void** result) override;
+  STDMETHODIMP CompareIDs(LPARAM parameter, PCUIDLIST_RELATIVE first, PCUIDLIST_RELATIVE second) override;
+  STDMETHODIMP GetAttributesOf(UINT count, PCUITEMID_CHILD_ARRAY items, SFGAOF* attributes) override;
+  STDMETHODIMP GetDisplayNameOf(PCUITEMID_CHILD item, SHGDNF flags, STRRET* name) override;
+  STDMETHODIMP SetNameOf(HWND window, PCUITEMID_CHILD item, LPCWSTR name, SHGDNF flags,
+                         PITEMID_CHILD* result) override;
+
+  // IPersistFolder: always positions at the root, whatever the shell passes.
+  STDMETHODIMP Initialize(PCIDLIST_ABSOLUTE list) override;
+
+ protected:
+  void* FindInterface(REFIID riid) noexcept override;
+  void Clear();
+
+  LPITEMIDLIST m_list = nullptr;
+  CGravonShellFolderBase* m_parent = nullptr;
+  IMalloc* m_malloc = nullptr;
+  std::unique_ptr<CGravonPidlManagerBase> m_pidlMgr;
+  std::unique_ptr<wchar_t[]> m_parsingName;
+  std::unique_ptr<wchar_t[]> m_pathText;
+};

@@ -1,0 +1,110 @@
+// The slots of a folder that create objects, for any set of concrete classes.
+#pragma once
+#include <windows.h>
+#include <shlobj.h>
+
+#include <type_traits>
+
+#include "shell/shell_folder_base.h"
+
+// Stands in for a class the module doesn't have yet: asking for it fails plainly.
+struct CClassNotAvailable {};
+
+// What the classes must offer (all are com::ComObject classes, made by com::Make):
+//   TFolder       the folder itself, positioned by Init(parent, list)
+//   TView         Init(IShellFolder* folder, LPCITEMIDLIST folderList)
+//   TEnum         Create(path, SHCONTF flags, HRESULT* result), which releases itself on failure
+//   TContextMenu  nothing beyond its interface
+//   TExtractIcon, TQueryInfo, TDropTarget   SetItem(LPCITEMIDLIST fullList), which copies it
+//   TDataObject   AddItem(LPCITEMIDLIST fullList), which copies it
+template <class TFolder, class TView, class TEnum, class TContextMenu, class TExtractIcon, class TQueryInfo,
+          class TDataObject, class TDropTarget>
+class CGravonShellFolderImpl : public CGravonShellFolderBase {
+ public:
+  using CGravonShellFolderBase::CGravonShellFolderBase;
+
+  STDMETHODIMP EnumObjects(HWND, SHCONTF flags, IEnumIDList** result) override {
+    if (!result) return E_INVALIDARG;
+    *result = nullptr;
+    wchar_t path[MAX_PATH];
+    GetFolderPath(path, MAX_PATH, false);
+    auto* list = new (std::nothrow) TEnum();
+    if (!list) return E_OUTOFMEMORY;
+    HRESULT hr = E_OUTOFMEMORY;
+    list->Create(path, flags, &hr);
+    if (FAILED(hr)) return hr;
+    *result = list;
+    return S_OK;
+  }
+
+  STDMETHODIMP BindToObject(PCUIDLIST_RELATIVE list, IBindCtx*, REFIID riid, void** result) override {
+    if (!result) return E_INVALIDARG;
+    *result = nullptr;
+    if (!list || m_pidlMgr->IsFile(list)) return E_INVALIDARG;
+    auto folder = com::Make<TFolder>();
+    if (!folder) return E_OUTOFMEMORY;
+    HRESULT hr = folder->Init(this, list);
+    if (FAILED(hr)) return hr;
+    return folder->QueryInterface(riid, result);
+  }
+
+  STDMETHODIMP CreateViewObject(HWND, REFIID riid, void** result) override {
+    if (!result) return E_INVALIDARG;
+    *result = nullptr;
+    if (riid == IID_IShellView) {
+      if constexpr (std::is_same_v<TView, CClassNotAvailable>) {
+        return CLASS_E_CLASSNOTAVAILABLE;
+      } else {
+        auto view = com::Make<TView>();
+        if (!view) return E_OUTOFMEMORY;
+        view->Init(static_cast<IShellFolder*>(this), m_list);
+        return view->QueryInterface(riid, result);
+      }
+    }
+    if (riid == IID_IContextMenu) {
+      auto menu = com::Make<TContextMenu>();
+      if (!menu) return E_OUTOFMEMORY;
+      return menu->QueryInterface(riid, result);
+    }
+    return E_NOINTERFACE;
+  }
+
+  // One object for one item, handed the item's full list; no multiple selections here.
+  STDMETHODIMP GetUIObjectOf(HWND, UINT count, PCUITEMID_CHILD_ARRAY items, REFIID riid, UINT*,
+                             void** result) override {
+    if (!result) return E_INVALIDARG;
+    *result = nullptr;
+    if (count != 1) return E_FAIL;
+    if (!items || !items[0]) return E_INVALIDARG;
+    const auto setItem = [](auto& object, LPCITEMIDLIST full) { return object.SetItem(full); };
+    if (riid == IID_IExtractIconW) return MakeItemObject<TExtractIcon>(items[0], riid, result, setItem);
+    if (riid == IID_IQueryInfo) return MakeItemObject<TQueryInfo>(items[0], riid, result, setItem);
+    if (riid == IID_IDataObject)
+      return MakeItemObject<TDataObject>(items[0], riid, result,
+                                         [](auto& object, LPCITEMIDLIST full) { return object.AddItem(full); });
+    if (riid == IID_IDropTarget) return MakeItemObject<TDropTarget>(items[0], riid, result, setItem);
+    return E_NOINTERFACE;
+  }
+
+ private:
+  template <class T, class Attach>
+  HRESULT MakeItemObject(LPCITEMIDLIST item, REFIID riid, void** result, Attach attach) {
+    if constexpr (std::is_same_v<T, CClassNotAvailable>) {
+      return CLASS_E_CLASSNOTAVAILABLE;
+    } else {
+      wchar_t path[MAX_PATH];
+      GetFolderPath(path, MAX_PATH, false);
+      LPITEMIDLIST folderList = m_pidlMgr->CreateListFromPath(path);
+      LPITEMIDLIST full = m_pidlMgr->Concatenate(folderList, item);
+      m_pidlMgr->Free(folderList);
+      auto object = com::Make<T>();
+      if (!object || !full) {
+        m_pidlMgr->Free(full);
+        return E_OUTOFMEMORY;
+      }
+      attach(*object.Get(), full);
+      m_pidlMgr->Free(full);
+      return object->QueryInterface(riid, result);
+    }
+  }
+};

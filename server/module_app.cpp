@@ -2,6 +2,7 @@
 
 #include "server/class_ids.h"
 #include "server/module_instance.h"
+#include "shell/item_services.h"
 #include "store/station_record.h"
 
 namespace {
@@ -18,11 +19,13 @@ BOOL CModuleApp::InitInstance() {
   if (!CAppBase::InitInstance()) return FALSE;
   resource_ = ModuleInstance();
   LoadDisplaySettings();
+  LoadImageLists();
   return TRUE;
 }
 
 int CModuleApp::ExitInstance() {
   SaveDisplaySettings();
+  DestroyImageLists();
   server_.Term();
   return CAppBase::ExitInstance();
 }

@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <shlobj.h>
+
 #include "loaded_dll.h"
 #include "server/class_ids.h"
 #include "server/com_base.h"
@@ -93,6 +95,20 @@ TEST(DllLifetime, ColumnWidthsAreReadAtLoadAndWrittenBackAtUnload) {
   EXPECT_EQ(size, 12u);
   EXPECT_EQ(saved[0], 140);
   EXPECT_EQ(saved[1], 260);
+}
+
+TEST_F(DllExports, ImageListsAreBuiltAtLoad) {
+  com::ComPtr<IClassFactory> factory;
+  ASSERT_EQ(dll_.getClassObject(CLSID_MarlixDLExtractIcon, IID_IClassFactory, factory.PutVoid()), S_OK);
+  com::ComPtr<IExtractIconW> icon;
+  ASSERT_EQ(factory->CreateInstance(nullptr, IID_IExtractIconW, icon.PutVoid()), S_OK);
+  for (UINT index : {0u, 1u, 2u}) {
+    HICON large = nullptr, small = nullptr;
+    EXPECT_EQ(icon->Extract(L"", index, &large, &small, 0), S_OK);
+    EXPECT_TRUE(large && small) << index;
+    if (large) DestroyIcon(large);
+    if (small) DestroyIcon(small);
+  }
 }
 
 }  // namespace

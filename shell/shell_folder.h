@@ -8,11 +8,12 @@
 #include "shell/extract_icon.h"
 #include "shell/query_info.h"
 #include "shell/shell_folder_impl.h"
+#include "transfer/data_object.h"
 
 // The classes the folder hands out that live elsewhere; each becomes its real class
 // here once it is in the module.
 using MarlixDLShellViewClass = CClassNotAvailable;   // CMarlixDLShellView
-using MarlixDLDataObjectClass = CClassNotAvailable;  // CMarlixDLDataObject
+using MarlixDLDataObjectClass = CMarlixDLDataObject;
 using MarlixDLDropTargetClass = CClassNotAvailable;  // CMarlixDLDropTarget
 
 class CMarlixDLShellFolder

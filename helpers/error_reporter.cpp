@@ -4,6 +4,7 @@
 #include <new>
 #include <vector>
 
+#include "helpers/errors_source.h"
 #include "store/string_table.h"
 
 namespace kld::ft {
@@ -174,6 +175,9 @@ std::wstring BuildErrorText(HRESULT code, const wchar_t* text1, const wchar_t* t
   }
   return result;
 }
+
+// Brings the named error sources' map into every module that reports errors.
+[[maybe_unused]] auto* const errorSourcesAtLoad = &CErrorsSourceBase::Find;
 
 // The module's two reporters, asked in this order.
 TStdErrorReporter theStdErrorReporter;

@@ -1,6 +1,7 @@
 #include <gtest/gtest.h>
 
 #include "helpers/error_reporter.h"
+#include "helpers/errors_source.h"
 
 using namespace kld::ft;
 
@@ -82,4 +83,24 @@ TEST(ErrorReporter, InternetCodesNeedTheLibraryLoadedByOthers) {
   EXPECT_FALSE(text.empty());
   EXPECT_NE(text[0], L'#');
   FreeLibrary(wininet);
+}
+
+namespace {
+
+class NamedSource : public kld::ft::CErrorsSourceBase {
+ public:
+  using CErrorsSourceBase::CErrorsSourceBase;
+  std::wstring GetErrorText(HRESULT) const override { return L"named"; }
+};
+
+}  // namespace
+
+TEST(ErrorsSource, SourcesAreFoundByNameWhileTheyLive) {
+  EXPECT_EQ(CErrorsSourceBase::Find(L"comm"), nullptr) << "the module defines none";
+  {
+    NamedSource first(L"comm");
+    NamedSource second(L"comm");
+    EXPECT_EQ(CErrorsSourceBase::Find(L"comm"), &first);
+  }
+  EXPECT_EQ(CErrorsSourceBase::Find(L"comm"), nullptr);
 }

@@ -91,6 +91,8 @@ TEST_F(TranslationFiles, TranslateTextFallsBackToTheCutEnglishText) {
   EXPECT_EQ(TranslateText(L"Open#$menu", kEnglish, kGerman, module, L"words"), L"Öffnen");
   EXPECT_EQ(TranslateText(L"Open#$other", kEnglish, kGerman, module, L"words"), L"Open");
   EXPECT_EQ(TranslateText(L"Missing", kEnglish, kGerman, module, L"words"), L"Missing");
+  EXPECT_EQ(TranslateText(L"Delete", kEnglish, kFrench, module, L"words"), L"Löschen")
+      << "the name's first path serves every language";
   EXPECT_EQ(TranslateText(L"Löschen", kGerman, kEnglish, module, L"words"), L"Delete");
   EXPECT_EQ(TranslateText(L"Delete#$x", kEnglish, kEnglish, module, L"words"), L"Delete");
   EXPECT_EQ(TranslateText(L"", kEnglish, kGerman, module, L"words"), L"");

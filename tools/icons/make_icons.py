@@ -119,27 +119,40 @@ def draw_level(c, s, scale=1.0, dx=0.0, dy=0.0):
     """A digital level on a tripod. `s` is the outline width in units."""
     T = lambda pts: transform(pts, scale, dx, dy)
     wood, wood_dark = hexrgb('#C98A2E'), hexrgb('#8A5A17')
-    # Tripod legs: the middle one sits behind, darker.
+    # Below 20 pixels dark outlines and small parts turn to mud: fewer, lighter strokes.
+    small = c.size * scale < 20
+    line = hexrgb('#6A5410') if small else OUTLINE
     head = (0.5, 0.56)
+    # Tripod legs: the middle one sits behind, darker.
     for foot, col in (((0.50, 0.97), wood_dark), ((0.16, 0.97), wood), ((0.84, 0.97), wood)):
-        c.fill(T(thick_line(head, foot, 0.085 + 2 * s)), OUTLINE)
-        c.fill(T(thick_line(head, foot, 0.085)), col)
-    # Tripod head plate.
-    outlined(c, T(rounded_rect(0.26, 0.52, 0.74, 0.60, 0.02)),
-             T(rounded_rect(0.26 + s, 0.52 + s, 0.74 - s, 0.60 - s, 0.01)), hexrgb('#6E6E6E'))
+        if small:
+            c.fill(T(thick_line(head, foot, 0.13)), col)
+        else:
+            c.fill(T(thick_line(head, foot, 0.085 + 2 * s)), OUTLINE)
+            c.fill(T(thick_line(head, foot, 0.085)), col)
+    if not small:
+        outlined(c, T(rounded_rect(0.26, 0.52, 0.74, 0.60, 0.02)),
+                 T(rounded_rect(0.26 + s, 0.52 + s, 0.74 - s, 0.60 - s, 0.01)), hexrgb('#6E6E6E'))
     # Instrument body with its display.
-    outlined(c, T(rounded_rect(0.24, 0.30, 0.76, 0.53, 0.05)),
-             T(rounded_rect(0.24 + s, 0.30 + s, 0.76 - s, 0.53 - s, 0.04)), hexrgb('#F3C623'))
-    c.fill(T(rounded_rect(0.31, 0.36, 0.56, 0.47, 0.015)), hexrgb('#1F3B57'))
-    c.fill(T(rounded_rect(0.33, 0.38, 0.54, 0.41, 0.0)), hexrgb('#7FD3F0'))
-    c.fill(T(circle(0.65, 0.42, 0.035)), hexrgb('#2B2B2B'))
+    c.fill(T(rounded_rect(0.24, 0.30, 0.76, 0.55 if small else 0.53, 0.05)), line)
+    c.fill(T(rounded_rect(0.24 + s, 0.30 + s, 0.76 - s, (0.55 if small else 0.53) - s, 0.04)), hexrgb('#F3C623'))
+    if small:
+        c.fill(T(rounded_rect(0.32, 0.38, 0.58, 0.46, 0.0)), hexrgb('#2F6FA8'))
+    else:
+        c.fill(T(rounded_rect(0.31, 0.36, 0.56, 0.47, 0.015)), hexrgb('#1F3B57'))
+        c.fill(T(rounded_rect(0.33, 0.38, 0.54, 0.41, 0.0)), hexrgb('#7FD3F0'))
+        c.fill(T(circle(0.65, 0.42, 0.035)), hexrgb('#2B2B2B'))
     # Telescope with objective and eyepiece.
-    outlined(c, T(rounded_rect(0.10, 0.13, 0.84, 0.31, 0.05)),
-             T(rounded_rect(0.10 + s, 0.13 + s, 0.84 - s, 0.31 - s, 0.04)), hexrgb('#E8E8E8'))
+    tube_line = hexrgb('#707070') if small else OUTLINE
+    c.fill(T(rounded_rect(0.10, 0.13, 0.84, 0.31, 0.05)), tube_line)
+    c.fill(T(rounded_rect(0.10 + s, 0.13 + s, 0.84 - s, 0.31 - s, 0.04)), hexrgb('#E8E8E8'))
     c.fill(T(rounded_rect(0.10 + s, 0.13 + s, 0.84 - s, 0.19, 0.03)), hexrgb('#FFFFFF'))
-    outlined(c, T(rounded_rect(0.80, 0.10, 0.93, 0.34, 0.03)),
-             T(rounded_rect(0.80 + s, 0.10 + s, 0.93 - s, 0.34 - s, 0.02)), hexrgb('#3C6FB0'))
-    c.fill(T(rounded_rect(0.05, 0.16, 0.12, 0.28, 0.02)), OUTLINE)
+    if small:
+        c.fill(T(rounded_rect(0.80, 0.10, 0.93, 0.34, 0.03)), hexrgb('#3C6FB0'))
+    else:
+        outlined(c, T(rounded_rect(0.80, 0.10, 0.93, 0.34, 0.03)),
+                 T(rounded_rect(0.80 + s, 0.10 + s, 0.93 - s, 0.34 - s, 0.02)), hexrgb('#3C6FB0'))
+        c.fill(T(rounded_rect(0.05, 0.16, 0.12, 0.28, 0.02)), OUTLINE)
 
 
 def draw_plus_badge(c, s, cx, cy, r):

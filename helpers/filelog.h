@@ -18,7 +18,7 @@ std::string FilelogPath();
 void RedirectLogStreams();
 void RestoreLogStreams();
 
-// One entry stamped with UTC time and thread id. LogTextA is skipped while no file is
+// One entry stamped with UTC time and thread id. Wide strings in formats take %ls. LogTextA is skipped while no file is
 // open; LogTextW always writes, and a write without a file simply fails.
 void LogTextA(const char* format, ...);
 void LogTextW(const wchar_t* format, ...);

@@ -93,15 +93,9 @@ TEST_F(Filelog, StartDeletesEarlierLogsOfTheNameOnly) {
 }
 
 TEST_F(Filelog, StreamsErrorsAndHeaderReachTheFile) {
-  RedirectLogStreams();
-  std::clog << "via clog " << 7 << std::endl;
-  std::wclog << L"via wclog" << std::endl;
-  StopFilelog();
-  std::clog << "" << std::flush;  // restored: this no longer reaches the log
+  LogTextA("before restart");
   ASSERT_TRUE(StartFilelog(L"marlix_logtest", true));
-  std::string first = ReadAll(LogPath());
-  EXPECT_EQ(first, "") << "restart recreates the file";
-
+  EXPECT_EQ(ReadAll(LogPath()), "") << "restart recreates the file";
   LogError("source.cpp", 42, L"Open %ls", HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND), L"x.txt");
   DumpSystemInfo();
   std::string text = ReadAll(LogPath());
@@ -121,12 +115,14 @@ TEST(FilelogStreams, ClogBufferWritesOneEntryPerSync) {
   std::clog << "one\ntwo" << std::flush;
   std::wclog << L"three" << std::flush;
   StopFilelog();
+  std::clog << "restored" << std::flush;
   std::string text = ReadAll(LogPath());
   DeleteFileW(LogPath().c_str());
   EXPECT_NE(text.find(" one\r\n"), std::string::npos) << text;
   EXPECT_NE(text.find(" three\r\n"), std::string::npos) << text;
   std::regex indented(R"(\n {21}two\r\n)");
   EXPECT_TRUE(std::regex_search(text, indented)) << text;
+  EXPECT_EQ(text.find("restored"), std::string::npos);
 }
 
 namespace {

@@ -1,5 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <windows.h>
+#include <oleauto.h>
+
 #include <iostream>
 #include <regex>
 
@@ -96,11 +99,20 @@ TEST_F(Filelog, StreamsErrorsAndHeaderReachTheFile) {
   LogTextA("before restart");
   ASSERT_TRUE(StartFilelog(L"marlix_logtest", true));
   EXPECT_EQ(ReadAll(LogPath()), "") << "restart recreates the file";
+  ICreateErrorInfo* create = nullptr;
+  ASSERT_EQ(CreateErrorInfo(&create), S_OK);
+  create->SetDescription(const_cast<LPOLESTR>(L"from the error object"));
+  IErrorInfo* info = nullptr;
+  create->QueryInterface(IID_IErrorInfo, reinterpret_cast<void**>(&info));
+  SetErrorInfo(0, info);
+  info->Release();
+  create->Release();
   LogError("source.cpp", 42, L"Open %ls", HRESULT_FROM_WIN32(ERROR_FILE_NOT_FOUND), L"x.txt");
   DumpSystemInfo();
   std::string text = ReadAll(LogPath());
   EXPECT_NE(text.find("Open x.txt - 0x80070002 (source.cpp, 42)\r\n"), std::string::npos) << text;
   EXPECT_NE(text.find("System description: "), std::string::npos);
+  EXPECT_NE(text.find("IErrorInfo description: from the error object\r\n"), std::string::npos);
   EXPECT_NE(text.find("Process id: " + std::to_string(GetCurrentProcessId()) + "\r\n"), std::string::npos);
   EXPECT_NE(text.find("64-bit build. Release version."), std::string::npos);
   EXPECT_NE(text.find("Languages root directory: "), std::string::npos);
@@ -154,4 +166,19 @@ TEST(StackDump, NamesTheCallersOwnFunction) {
   std::string all;
   for (const auto& f : collector.frames) all += f + "\n";
   EXPECT_NE(all.find("MarlixStackProbe"), std::string::npos) << all;
+
+  // Another thread is suspended in place and goes on afterwards.
+  HANDLE go = CreateEventW(nullptr, TRUE, FALSE, nullptr);
+  HANDLE other = CreateThread(nullptr, 0, [](void* event) -> DWORD {
+    return WaitForSingleObject(static_cast<HANDLE>(event), INFINITE);
+  }, go, 0, nullptr);
+  Sleep(50);
+  Collector second;
+  DumpThreadStack({other, &second});
+  EXPECT_EQ(second.ends, 1);
+  EXPECT_FALSE(second.frames.empty());
+  SetEvent(go);
+  EXPECT_EQ(WaitForSingleObject(other, 5000), WAIT_OBJECT_0);
+  CloseHandle(other);
+  CloseHandle(go);
 }

@@ -24,8 +24,8 @@ bool CMarlixDLExtractIcon::SetItem(LPCITEMIDLIST fullList) {
 STDMETHODIMP CMarlixDLExtractIcon::GetIconLocation(UINT, LPWSTR, UINT, int* index, UINT* outFlags) {
   if (outFlags) *outFlags = GIL_NOTFILENAME;
   int image = IMAGE_ADD_LEVEL;
+  // An empty list has no type to read: it counts as "anything else".
   LPCITEMIDLIST last = m_pidlMgr ? m_pidlMgr->GetLast(m_list) : nullptr;
-  if (!last && m_list && IdSize(m_list) != 0) last = m_list;
   if (last) {
     switch (CPidlMgr::GetType(last)) {
       case PIDL_LEVEL: image = IMAGE_LEVEL; break;

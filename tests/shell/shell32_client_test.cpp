@@ -164,4 +164,13 @@ TEST_F(Shell32Client, AbsoluteListsGiveNamesAndIconsThroughTheShell) {
   DestroyIcon(large);
 }
 
+// Runs last: the tests above have released all they got from the shell.
+TEST(Shell32ClientModule, UnloadsOnceTheShellHasLetGo) {
+  HMODULE module = GetModuleHandleW(L"MarlixDLShellExt.dll");
+  ASSERT_TRUE(module) << "loaded by the shell in the tests before";
+  auto canUnload = reinterpret_cast<HRESULT(STDAPICALLTYPE*)()>(GetProcAddress(module, "DllCanUnloadNow"));
+  ASSERT_TRUE(canUnload);
+  EXPECT_EQ(canUnload(), S_OK) << "every object of the module was released";
+}
+
 }  // namespace

@@ -227,6 +227,10 @@ TEST(ShellFolder, HandsOutObjectsWithTheItemsFullList) {
     icon->GetIconLocation(0, nullptr, 0, &index, &flags);
     EXPECT_EQ(index, 2);
 
+    com::ComPtr<IDataObject> data;
+    EXPECT_EQ(level->GetUIObjectOf(nullptr, 1, items, IID_IDataObject, nullptr, data.PutVoid()), S_OK);
+    EXPECT_TRUE(data);
+
     com::ComPtr<IUnknown> none;
     EXPECT_EQ(level->GetUIObjectOf(nullptr, 2, items, IID_IQueryInfo, nullptr, none.PutVoid()), E_FAIL);
     EXPECT_EQ(level->GetUIObjectOf(nullptr, 0, items, IID_IQueryInfo, nullptr, none.PutVoid()), E_FAIL);

@@ -1,0 +1,56 @@
+#include "shell/view_notify.h"
+
+#include "server/module_instance.h"
+
+UINT GlobalNotifyMessage = RegisterWindowMessageW(L"TSShell Extension - Global Notify");
+UINT DownloadMessage =
+    RegisterWindowMessageW(L"Marlix Total Stations Shell Extension - Download Message");
+UINT UploadMessage =
+    RegisterWindowMessageW(L"Marlix Total Stations Shell Extension - Upload Message");
+UINT GetEnumIDListMessage = RegisterWindowMessageW(L"KLD Shell Extension - Get EnumIDList");
+
+void BroadcastChange(UINT lastIdType) {
+  PostMessageW(HWND_BROADCAST, GlobalNotifyMessage, 1, static_cast<LPARAM>(lastIdType));
+}
+
+namespace {
+
+LRESULT CALLBACK NotifyWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+  if (message == GlobalNotifyMessage) {
+    auto* pair = reinterpret_cast<NotifyWindowPair*>(GetWindowLongPtrW(window, GWLP_USERDATA));
+    if (pair) {
+      SendMessageW(pair->ViewWindow, message, wParam, lParam);
+      return 0;
+    }
+  }
+  return DefWindowProcW(window, message, wParam, lParam);
+}
+
+}  // namespace
+
+HRESULT CreateNotifyWindow(NotifyWindowPair& pair, HWND viewWindow) {
+  pair.ViewWindow = viewWindow;
+  HINSTANCE module = ModuleInstance();
+  WNDCLASSW existing{};
+  if (!GetClassInfoW(module, kNotifyWindowClass, &existing)) {
+    WNDCLASSW wc{};
+    wc.style = CS_HREDRAW | CS_VREDRAW;
+    wc.lpfnWndProc = NotifyWindowProc;
+    wc.hInstance = module;
+    wc.hCursor = LoadCursorW(nullptr, IDC_ARROW);
+    wc.hbrBackground = reinterpret_cast<HBRUSH>(COLOR_WINDOW + 1);
+    wc.lpszClassName = kNotifyWindowClass;
+    if (!RegisterClassW(&wc)) return E_FAIL;
+  }
+  HWND hidden = CreateWindowExW(0, kNotifyWindowClass, nullptr, 0, 0, 0, 0, 0, nullptr, nullptr,
+                                module, &pair);
+  if (!hidden) return E_FAIL;
+  pair.Hidden = hidden;
+  SetWindowLongPtrW(hidden, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(&pair));
+  return S_OK;
+}
+
+void DestroyNotifyWindow(NotifyWindowPair& pair) {
+  if (IsWindow(pair.Hidden)) DestroyWindow(pair.Hidden);
+  pair.Hidden = nullptr;
+}

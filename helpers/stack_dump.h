@@ -23,6 +23,8 @@ struct CStackDumpRequest {
 
 // Suspends the thread, walks at most 256 frames and resolves each return address. The
 // calling thread's own stack is walked from a helper thread while the caller waits.
+// Frames are reported before the thread resumes: a handler must not wait for anything
+// that thread may hold (the default one takes the log's lock).
 void DumpThreadStack(const CStackDumpRequest& request);
 
 }  // namespace kld::ft

@@ -16,6 +16,20 @@ constexpr LANGID kEnglish = 1033;
 // Created at the first real translation; its destruction comes with the module's unload.
 bool managerCreated = false;
 std::unique_ptr<CTranslateFileManager> manager;
+// Every Explorer window has a thread of its own, and several may open at once: the
+// maps are guarded. A loaded file is never changed, so lookups in it need no lock.
+SRWLOCK managerLock = SRWLOCK_INIT;
+
+class ExclusiveLock {
+ public:
+  explicit ExclusiveLock(SRWLOCK* lock) : lock_(lock) { AcquireSRWLockExclusive(lock_); }
+  ~ExclusiveLock() { ReleaseSRWLockExclusive(lock_); }
+  ExclusiveLock(const ExclusiveLock&) = delete;
+  ExclusiveLock& operator=(const ExclusiveLock&) = delete;
+
+ private:
+  SRWLOCK* lock_;
+};
 
 std::wstring CutAtMarker(const std::wstring& text) {
   size_t marker = text.find(L"#$");
@@ -81,11 +95,16 @@ std::wstring TranslateText(const std::wstring& text, LANGID sourceLanguage, LANG
     reverse = true;
   }
   try {
-    if (!managerCreated) {
-      manager = std::make_unique<CTranslateFileManager>();
-      managerCreated = true;
+    std::shared_ptr<CTranslateFile> file;
+    {
+      ExclusiveLock lock(&managerLock);
+      if (!managerCreated) {
+        manager = std::make_unique<CTranslateFileManager>();
+        managerCreated = true;
+      }
+      file = GetTranslateFile(*manager, module, sourceLanguage, targetLanguage, name);
     }
-    if (auto file = GetTranslateFile(*manager, module, sourceLanguage, targetLanguage, name)) {
+    if (file) {
       std::wstring translated = file->Find(text, reverse);
       if (!translated.empty()) return translated;
     }

@@ -35,8 +35,8 @@ std::shared_ptr<CTranslateFile> GetTranslateFile(CTranslateFileManager& manager,
                                                  LANGID sourceLanguage, LANGID targetLanguage,
                                                  const wchar_t* name);
 
-// `text` in the target language; at worst `text` cut at its first "#$". Not thread-safe:
-// callers are the threads that show windows.
+// `text` in the target language; at worst `text` cut at its first "#$". Any thread may
+// call it; GetTranslateFile on a manager of one's own needs the caller's own care.
 std::wstring TranslateText(const std::wstring& text, LANGID sourceLanguage, LANGID targetLanguage,
                            HMODULE module, const wchar_t* name);
 

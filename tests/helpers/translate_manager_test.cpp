@@ -1,6 +1,9 @@
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <filesystem>
+#include <thread>
+#include <vector>
 
 #include "helpers/app_helpers.h"
 #include "helpers/translate_manager.h"
@@ -98,4 +101,21 @@ TEST_F(TranslationFiles, TranslateTextFallsBackToTheCutEnglishText) {
   EXPECT_EQ(TranslateText(L"", kEnglish, kGerman, module, L"words"), L"");
   EXPECT_EQ(TranslateText(L"a#$b", kEnglish, kGerman, module, L"nofile"), L"a");
   EXPECT_NE(TranslateFileManagerIfCreated(), nullptr);
+}
+
+TEST_F(TranslationFiles, ThreadsTranslatingAtOnceShareOneFile) {
+  Write(L"de-DE\\threads.txt", L"[Start]\n[Starten]\n");
+  std::atomic<int> translated{0};
+  std::vector<std::thread> threads;
+  for (int t = 0; t < 8; ++t) {
+    threads.emplace_back([&translated] {
+      for (int i = 0; i < 200; ++i) {
+        const wchar_t* name = i % 2 ? L"threads" : L"threads_missing";
+        std::wstring text = TranslateText(L"Start", kEnglish, kGerman, ModuleInstance(), name);
+        translated += text == (i % 2 ? L"Starten" : L"Start");
+      }
+    });
+  }
+  for (auto& thread : threads) thread.join();
+  EXPECT_EQ(translated.load(), 8 * 200);
 }

@@ -190,6 +190,24 @@ TEST_F(DownloadDialogTest, GoodCallbackAfterCancelIsAGoodEnd) {
   EXPECT_EQ(result, IDOK);
 }
 
+TEST_F(DownloadDialogTest, AnOkCommandNotFromTheLibraryEndsWithOkAndNoFile) {
+  ConfigureStandIn("wait_for_terminate=1\n");
+  std::wstring target = TargetPath();
+  INT_PTR result = RunDialog(TestLevel(), target, [&] {
+    HWND dialog = WaitForDialog();
+    ASSERT_NE(dialog, nullptr);
+    Click(dialog, IDC_TRANSFER_START);
+    ASSERT_TRUE(WaitForControlText(dialog, IDC_TRANSFER_STATUS, L"Waiting for download..."));
+    // What the dialog manager sends for Enter in the text box, there being no default button.
+    PostMessageW(dialog, WM_COMMAND, IDOK, 0);
+    EXPECT_TRUE(WaitUntilGone(dialog, 5000));
+  });
+  EXPECT_EQ(result, IDOK);
+  EXPECT_FALSE(FileExistsAt(target + L".txt"));
+  std::vector<std::string> log = StandInLog();
+  EXPECT_NE(std::find(log.begin(), log.end(), "Abandoned"), log.end());
+}
+
 TEST_F(DownloadDialogTest, EachFailingStepShowsItsTextAndStopsTheCalls) {
   struct Case {
     const char* settings;

@@ -1,5 +1,6 @@
 #include "transfer/data_object.h"
 
+#include <memory>
 #include <new>
 #include <string>
 
@@ -7,6 +8,7 @@
 #include "server/class_creators.h"
 #include "store/pidl_manager.h"
 #include "store/station_record.h"
+#include "transfer/download_dialog.h"
 #include "transfer/enum_format_etc.h"
 #include "transfer/stream2.h"
 
@@ -33,7 +35,9 @@ bool IsGlobalRequest(const FORMATETC& f, CLIPFORMAT cf) noexcept {
 }
 
 // No second transfer may start while a transfer dialog runs on any thread.
-bool TransferDialogOpen() noexcept { return false; }
+bool TransferDialogOpen() noexcept {
+  return IsWindow(DownloadDialogWindow) || IsWindow(UploadDialogWindow);
+}
 
 void HandOver(STGMEDIUM& medium, HGLOBAL block) noexcept {
   medium.tymed = TYMED_HGLOBAL;
@@ -52,7 +56,13 @@ CMarlixDLDataObject::~CMarlixDLDataObject() {
 
 void CMarlixDLDataObject::AddItem(LPCITEMIDLIST list) {
   CPidlMgr pidl;
-  if (LPITEMIDLIST copy = pidl.Copy(list)) ItemList.push_back(copy);
+  LPITEMIDLIST copy = pidl.Copy(list);
+  if (!copy) return;
+  try {
+    ItemList.push_back(copy);
+  } catch (const std::bad_alloc&) {
+    pidl.Free(copy);
+  }
 }
 
 void CMarlixDLDataObject::SetDragImage(HIMAGELIST image, HWND window, POINT hotSpot) noexcept {
@@ -65,11 +75,15 @@ STDMETHODIMP CMarlixDLDataObject::GetData(FORMATETC* format, STGMEDIUM* medium) 
   if (!format || !medium) return E_INVALIDARG;
   if (TransferDialogOpen()) return E_INVALIDARG;
   const FORMATETC& f = *format;
-  if (IsGlobalRequest(f, DropEffectFormat())) return GetDropEffect(*medium);
-  if (IsGlobalRequest(f, GroupDescriptorFormat())) return GetGroupDescriptor(*medium);
-  if (IsStreamRequest(f, FileContentsFormat())) return GetFileContents(f.lindex, *medium);
-  if (IsGlobalRequest(f, IdListArrayFormat())) return GetIdListArray(*medium);
-  if (IsGlobalRequest(f, StationsFormat())) return GetStations(*medium);
+  try {
+    if (IsGlobalRequest(f, DropEffectFormat())) return GetDropEffect(*medium);
+    if (IsGlobalRequest(f, GroupDescriptorFormat())) return GetGroupDescriptor(*medium);
+    if (IsStreamRequest(f, FileContentsFormat())) return GetFileContents(f.lindex, *medium);
+    if (IsGlobalRequest(f, IdListArrayFormat())) return GetIdListArray(*medium);
+    if (IsGlobalRequest(f, StationsFormat())) return GetStations(*medium);
+  } catch (const std::bad_alloc&) {
+    return E_OUTOFMEMORY;
+  }
   return E_INVALIDARG;
 }
 
@@ -101,7 +115,7 @@ HRESULT CMarlixDLDataObject::GetGroupDescriptor(STGMEDIUM& medium) {
   return S_OK;
 }
 
-HRESULT CMarlixDLDataObject::GetFileContents(LONG index, STGMEDIUM& /*medium*/) {
+HRESULT CMarlixDLDataObject::GetFileContents(LONG index, STGMEDIUM& medium) {
   if (ItemList.empty()) return S_FALSE;
   if (index < 0 || static_cast<size_t>(index) >= ItemList.size()) return S_FALSE;
   LPCITEMIDLIST item = ItemList[static_cast<size_t>(index)];
@@ -114,7 +128,25 @@ HRESULT CMarlixDLDataObject::GetFileContents(LONG index, STGMEDIUM& /*medium*/) 
   level.Name = PathComponent(path, 1);
   if (HRESULT hr = FindStation(level); hr != 0) return hr;
 
-  return S_FALSE;
+  std::wstring target;
+  // The bare system code goes back as it is, not converted.
+  if (DWORD error = MakeDownloadTargetPath(target); error != 0) return static_cast<HRESULT>(error);
+
+  INT_PTR result;
+  {
+    auto dialog = std::make_unique<CDownloadProgressDialog>(nullptr, level, target);
+    result = dialog->DoModal();
+  }
+  if (result == IDCANCEL) return S_FALSE;
+
+  target += L".txt";
+  auto stream = com::Make<CStream2>();
+  if (!stream) return E_OUTOFMEMORY;
+  stream->AttachFile(target, kVirtualFileName, true);
+  medium.tymed = TYMED_ISTREAM;
+  medium.pstm = stream.Detach();
+  medium.pUnkForRelease = nullptr;
+  return S_OK;
 }
 
 HRESULT CMarlixDLDataObject::GetIdListArray(STGMEDIUM& medium) {

@@ -2,8 +2,8 @@
 
 #include <chrono>
 #include <cstring>
-#include <vector>
 
+#include "tools/marlix_comm/survey_job.h"
 
 namespace {
 
@@ -17,28 +17,23 @@ void AppendId(std::vector<BYTE>& bytes, DWORD type, const std::wstring& text) {
   std::memcpy(&bytes[at + 14], text.c_str(), textBytes);
 }
 
-bool IsDialogClass(HWND w) {
-  wchar_t cls[16] = {};
+bool IsDialog(HWND w, bool download) {
+  wchar_t cls[16] = {}, title[64] = {};
   GetClassNameW(w, cls, 16);
-  return std::wcscmp(cls, L"#32770") == 0;
-}
-
-bool IsDownloadDialog(HWND w) {
-  wchar_t title[64] = {};
   GetWindowTextW(w, title, 64);
-  return IsDialogClass(w) && std::wcscmp(title, L"Download file from Digital Level") == 0;
+  return IsWindowVisible(w) && std::wcscmp(cls, L"#32770") == 0 &&
+         (!download || std::wcscmp(title, L"Download file from Digital Level") == 0);
 }
 
-BOOL CALLBACK FindDialog(HWND w, LPARAM found) {
-  if (!IsWindowVisible(w) || !IsDownloadDialog(w)) return TRUE;
+BOOL CALLBACK FindDownloadDialog(HWND w, LPARAM found) {
+  if (!IsDialog(w, true)) return TRUE;
   *reinterpret_cast<HWND*>(found) = w;
   return FALSE;
 }
 
-// Cancel for the dialog, OK for a message box.
+// Cancel for the download dialog, OK for a message box.
 BOOL CALLBACK DismissOne(HWND w, LPARAM) {
-  if (!IsWindowVisible(w) || !IsDialogClass(w)) return TRUE;
-  PostMessageW(w, WM_COMMAND, IsDownloadDialog(w) ? IDCANCEL : IDOK, 0);
+  if (IsDialog(w, false)) PostMessageW(w, WM_COMMAND, IsDialog(w, true) ? IDCANCEL : IDOK, 0);
   return TRUE;
 }
 
@@ -49,20 +44,14 @@ LPITEMIDLIST MakeFullList(const std::wstring& level, bool withFile) {
   AppendId(bytes, 1, L"Marlix Digital Levels");
   AppendId(bytes, 2, level);
   if (withFile) AppendId(bytes, 3, L"file1.tkf");
-  bytes.push_back(0);
-  bytes.push_back(0);
+  bytes.resize(bytes.size() + 2, 0);
   auto* list = static_cast<LPITEMIDLIST>(CoTaskMemAlloc(bytes.size()));
   std::memcpy(list, bytes.data(), bytes.size());
   return list;
 }
 
-DialogDriver::DialogDriver(DWORD dialogThread, int button, std::function<void(HWND)> whileOpen,
-                           DWORD limitMs)
-    : whileOpen_(std::move(whileOpen)) {
-  thread_ = std::thread([=, this] { Run(dialogThread, button, limitMs); });
-}
-
-DialogDriver::~DialogDriver() { Finish(); }
+DialogDriver::DialogDriver(DWORD dialogThread, int button, std::function<void(HWND)> whileOpen, DWORD limitMs)
+    : whileOpen_(std::move(whileOpen)), thread_([=, this] { Run(dialogThread, button, limitMs); }) {}
 
 bool DialogDriver::Finish() {
   stop_ = true;
@@ -71,27 +60,20 @@ bool DialogDriver::Finish() {
 }
 
 void DialogDriver::Run(DWORD dialogThread, int button, DWORD limitMs) {
-  using Clock = std::chrono::steady_clock;
-  const auto start = Clock::now();
-  const auto deadline = start + std::chrono::milliseconds(limitMs);
+  const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(limitMs);
   HWND dialog = nullptr;
-  while (!stop_ && Clock::now() < deadline) {
-    EnumThreadWindows(dialogThread, FindDialog, reinterpret_cast<LPARAM>(&dialog));
-    if (dialog) break;
-    Sleep(10);
+  while (!stop_ && !dialog && std::chrono::steady_clock::now() < deadline) {
+    EnumThreadWindows(dialogThread, FindDownloadDialog, reinterpret_cast<LPARAM>(&dialog));
+    if (!dialog) Sleep(10);
   }
   if (dialog) {
-    msToDialog_ = std::chrono::duration<double, std::milli>(Clock::now() - start).count();
     seen_ = true;
     if (whileOpen_) whileOpen_(dialog);
-    if (HWND b = GetDlgItem(dialog, button)) {
-      SendMessageW(b, BM_CLICK, 0, 0);
-      clicked_ = true;
-    }
+    SendMessageW(GetDlgItem(dialog, button), BM_CLICK, 0, 0);
+    clicked_ = true;
   }
-  // Until released: anything of the dialog's thread that outlives the limit is dismissed.
   while (!stop_) {
-    if (Clock::now() >= deadline) EnumThreadWindows(dialogThread, DismissOne, 0);
+    if (std::chrono::steady_clock::now() >= deadline) EnumThreadWindows(dialogThread, DismissOne, 0);
     Sleep(50);
   }
 }
@@ -102,19 +84,29 @@ std::wstring TempDir() {
   return dir;
 }
 
-bool FileExists(const std::wstring& path) {
-  return GetFileAttributesW(path.c_str()) != INVALID_FILE_ATTRIBUTES;
-}
+bool FileExists(const std::wstring& path) { return GetFileAttributesW(path.c_str()) != INVALID_FILE_ATTRIBUTES; }
 
-std::wstring ListTransferFiles() {
-  std::wstring names;
+std::set<std::wstring> TransferFiles() {
+  std::set<std::wstring> names;
   WIN32_FIND_DATAW found;
   HANDLE h = FindFirstFileW((TempDir() + L"TKF*.txt").c_str(), &found);
   if (h == INVALID_HANDLE_VALUE) return names;
-  do {
-    names += found.cFileName;
-    names += L";";
-  } while (FindNextFileW(h, &found));
+  do names.insert(found.cFileName);
+  while (FindNextFileW(h, &found));
   FindClose(h);
   return names;
+}
+
+namespace {
+// The stand-in stamps its job with the time of writing; all else is fixed.
+std::string WithoutDate(std::string job) {
+  size_t at = job.find("\r\nDATE,");
+  if (at != std::string::npos) job.erase(at, job.find("\r\n", at + 2) - at);
+  return job;
+}
+}  // namespace
+
+bool IsStandInJob(const std::vector<char>& bytes) {
+  return !bytes.empty() &&
+         WithoutDate(std::string(bytes.begin(), bytes.end())) == WithoutDate(standin::MakeSurveyJob(0));
 }

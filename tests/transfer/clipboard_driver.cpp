@@ -76,6 +76,7 @@ int Reader(const std::wstring& out) {
 
 int Owner(const wchar_t* self) {
   RegistrySandbox sandbox;
+  PrivateTempDir temp;
   CStationRecord level;
   level.Name = L"Clip";
   if (AddStation(level) != S_OK) return Fail("AddStation");

@@ -78,6 +78,34 @@ void DialogDriver::Run(DWORD dialogThread, int button, DWORD limitMs) {
   }
 }
 
+namespace {
+std::wstring Env(const wchar_t* name) {
+  wchar_t value[MAX_PATH] = {};
+  return GetEnvironmentVariableW(name, value, MAX_PATH) ? value : L"";
+}
+}  // namespace
+
+PrivateTempDir::PrivateTempDir() : oldTmp_(Env(L"TMP")), oldTemp_(Env(L"TEMP")) {
+  static int n = 0;
+  dir_ = TempDir() + L"marlix_data_" + std::to_wstring(GetCurrentProcessId()) + L"_" + std::to_wstring(++n);
+  CreateDirectoryW(dir_.c_str(), nullptr);
+  SetEnvironmentVariableW(L"TMP", dir_.c_str());
+  SetEnvironmentVariableW(L"TEMP", dir_.c_str());
+}
+
+PrivateTempDir::~PrivateTempDir() {
+  SetEnvironmentVariableW(L"TMP", oldTmp_.empty() ? nullptr : oldTmp_.c_str());
+  SetEnvironmentVariableW(L"TEMP", oldTemp_.empty() ? nullptr : oldTemp_.c_str());
+  WIN32_FIND_DATAW found;
+  HANDLE h = FindFirstFileW((dir_ + L"\\*").c_str(), &found);
+  if (h != INVALID_HANDLE_VALUE) {
+    do DeleteFileW((dir_ + L"\\" + found.cFileName).c_str());
+    while (FindNextFileW(h, &found));
+    FindClose(h);
+  }
+  RemoveDirectoryW(dir_.c_str());
+}
+
 std::wstring TempDir() {
   wchar_t dir[MAX_PATH] = {};
   GetTempPathW(MAX_PATH, dir);

@@ -37,6 +37,19 @@ class DialogDriver {
 // Whether the bytes are the job the stand-in instrument library sends.
 bool IsStandInJob(const std::vector<char>& bytes);
 
+// Points this process's temporary folder (TMP, TEMP) at a fresh folder of its own for its
+// lifetime, so downloads of test programs running side by side never meet.
+class PrivateTempDir {
+ public:
+  PrivateTempDir();
+  ~PrivateTempDir();
+  PrivateTempDir(const PrivateTempDir&) = delete;
+  PrivateTempDir& operator=(const PrivateTempDir&) = delete;
+
+ private:
+  std::wstring dir_, oldTmp_, oldTemp_;
+};
+
 std::wstring TempDir();
 bool FileExists(const std::wstring& path);
 // Names of the TKF*.txt files in the temporary folder, as downloads leave them.

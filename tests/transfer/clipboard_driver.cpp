@@ -1,7 +1,7 @@
 // Two processes and the real OLE clipboard. "owner" puts the data object of a level's
 // file on the clipboard, starts "reader" and works its own download dialog from a helper
 // thread; "reader" takes the descriptor and then the contents through OLE's marshalling
-// and saves them. The owner then checks the bytes and that the temporary file is gone.
+// and checks the bytes. The owner then checks that the temporary file is gone.
 #include <windows.h>
 #include <ole2.h>
 #include <shlobj.h>
@@ -29,19 +29,7 @@ int Fail(const char* what, long code = 0) {
 
 CLIPFORMAT Cf(const wchar_t* name) { return static_cast<CLIPFORMAT>(RegisterClipboardFormatW(name)); }
 
-std::vector<char> ReadWhole(const std::wstring& path) {
-  std::vector<char> bytes;
-  HANDLE f = CreateFileW(path.c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr, OPEN_EXISTING, 0, nullptr);
-  if (f == INVALID_HANDLE_VALUE) return bytes;
-  bytes.resize(GetFileSize(f, nullptr));
-  DWORD got = 0;
-  ReadFile(f, bytes.data(), DWORD(bytes.size()), &got, nullptr);
-  bytes.resize(got);
-  CloseHandle(f);
-  return bytes;
-}
-
-int Reader(const std::wstring& out) {
+int Reader() {
   com::ComPtr<IDataObject> clip;
   HRESULT hr = OleGetClipboard(clip.Put());
   if (FAILED(hr)) return Fail("OleGetClipboard", hr);
@@ -60,18 +48,18 @@ int Reader(const std::wstring& out) {
   f = {Cf(L"FileContents"), nullptr, DVASPECT_CONTENT, 0, TYMED_ISTREAM};
   hr = clip->GetData(&f, &m);
   if (hr != S_OK || m.tymed != TYMED_ISTREAM || !m.pstm) return Fail("contents", hr);
-  HANDLE file = CreateFileW(out.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, 0, nullptr);
-  if (file == INVALID_HANDLE_VALUE) return Fail("output file", GetLastError());
+  std::vector<char> bytes;
   char block[4096];
   ULONG got = 0;
   do {
     hr = m.pstm->Read(block, sizeof block, &got);
-    DWORD written = 0;
-    if (hr == S_OK && got) WriteFile(file, block, got, &written, nullptr);
+    if (hr == S_OK) bytes.insert(bytes.end(), block, block + got);
   } while (hr == S_OK && got == sizeof block);
-  CloseHandle(file);
   ReleaseStgMedium(&m);
-  return hr == S_OK ? 0 : Fail("read", hr);
+  if (hr != S_OK) return Fail("read", hr);
+  if (!IsStandInJob(bytes)) return Fail("bytes differ from the stand-in's job", long(bytes.size()));
+  std::printf("ok: %zu bytes through the clipboard\n", bytes.size());
+  return 0;
 }
 
 int Owner(const wchar_t* self) {
@@ -81,8 +69,6 @@ int Owner(const wchar_t* self) {
   level.Name = L"Clip";
   if (AddStation(level) != S_OK) return Fail("AddStation");
   const std::set<std::wstring> before = TransferFiles();
-  const std::wstring out = TempDir() + L"clipboard_copy.tkf";
-  DeleteFileW(out.c_str());
 
   auto data = com::Make<CMarlixDLDataObject>();
   win::UniqueCoMem<ITEMIDLIST> list(MakeFullList(L"Clip", true));
@@ -92,7 +78,7 @@ int Owner(const wchar_t* self) {
   if (FAILED(hr)) return Fail("OleSetClipboard", hr);
 
   DialogDriver driver(GetCurrentThreadId(), 220, {}, kLimitMs);
-  std::wstring cmd = L"\"" + std::wstring(self) + L"\" reader \"" + out + L"\"";
+  std::wstring cmd = L"\"" + std::wstring(self) + L"\" reader";
   STARTUPINFOW si{sizeof si};
   PROCESS_INFORMATION pi{};
   if (!CreateProcessW(self, cmd.data(), nullptr, nullptr, FALSE, 0, nullptr, nullptr, &si, &pi))
@@ -101,8 +87,7 @@ int Owner(const wchar_t* self) {
 
   // Keep the apartment serving the reader's calls until it ends.
   const ULONGLONG deadline = GetTickCount64() + kLimitMs;
-  DWORD wait;
-  while ((wait = MsgWaitForMultipleObjects(1, &pi.hProcess, FALSE, 100, QS_ALLINPUT)) != WAIT_OBJECT_0) {
+  while (MsgWaitForMultipleObjects(1, &pi.hProcess, FALSE, 100, QS_ALLINPUT) != WAIT_OBJECT_0) {
     MSG msg;
     while (PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE)) {
       TranslateMessage(&msg);
@@ -122,11 +107,7 @@ int Owner(const wchar_t* self) {
 
   if (!clicked) return Fail("download dialog never came up");
   if (readerCode != 0) return Fail("reader", long(readerCode));
-  std::vector<char> copy = ReadWhole(out);
-  DeleteFileW(out.c_str());
-  if (!IsStandInJob(copy)) return Fail("bytes differ from the stand-in's job", long(copy.size()));
   if (TransferFiles() != before) return Fail("a temporary .txt file stayed behind");
-  std::printf("ok: %zu bytes through the clipboard\n", copy.size());
   return 0;
 }
 
@@ -140,7 +121,7 @@ int main() {
   if (FAILED(OleInitialize(nullptr))) return 3;
   int rc = 2;
   if (argc >= 2 && std::wcscmp(argv[1], L"owner") == 0) rc = Owner(self);
-  else if (argc >= 3 && std::wcscmp(argv[1], L"reader") == 0) rc = Reader(argv[2]);
+  else if (argc >= 2 && std::wcscmp(argv[1], L"reader") == 0) rc = Reader();
   OleUninitialize();
   LocalFree(argv);
   return rc;

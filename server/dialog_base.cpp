@@ -129,7 +129,7 @@ void CDialog::DdxComboPrefix(bool toControls, int id, std::wstring& value) {
 
 bool CDialog::Dispatch(UINT message, WPARAM wParam, LPARAM lParam, INT_PTR& result) {
   for (const MessageEntry& entry : messages_) {
-    if (entry.message == message) {
+    if (entry.message == message && message != 0) {  // 0: a registration that failed
       LRESULT answer = entry.handler(wParam, lParam);
       if (window_) SetWindowLongPtrW(window_, DWLP_MSGRESULT, answer);
       result = TRUE;

@@ -3,7 +3,6 @@
 marlix_test(comm_tests SOURCES
   ${CMAKE_CURRENT_SOURCE_DIR}/comm_test_support.cpp
   ${CMAKE_CURRENT_SOURCE_DIR}/comm_interface_test.cpp
-  ${CMAKE_CURRENT_SOURCE_DIR}/dialog_template_test.cpp
   ${CMAKE_CURRENT_SOURCE_DIR}/download_dialog_test.cpp
   ${CMAKE_CURRENT_SOURCE_DIR}/view_notify_test.cpp)
 # A folder of its own: the stand-in's control file and log live beside the program.

@@ -1,8 +1,8 @@
 // The library contract as the system sees it: table positions, codes, the callback,
-// the points block and the temporary target path.
+// the temporary target path, and the registered messages.
 #include <gtest/gtest.h>
 
-#include <cstring>
+#include <utility>
 
 #include "shell/view_notify.h"
 #include "transfer/comm_interface.h"
@@ -11,19 +11,16 @@
 namespace {
 
 // A hand-made object with a 14-entry table, as the other compiler lays it out: each
-// entry records its own position, so a call through IMarlixComm shows which slot it used.
+// entry records its position and first two arguments.
 struct FakeObject {
   void** table;
-  int lastSlot = -1;
-  long long args[7] = {};
+  int slot = -1;
+  long long first = 0, second = 0;
 };
 
 template <int Slot>
-long long Entry(FakeObject* self, long long a, long long b, long long c, long long d, long long e,
-                long long f, long long g) {
-  self->lastSlot = Slot;
-  long long values[7] = {a, b, c, d, e, f, g};
-  std::memcpy(self->args, values, sizeof values);
+long long Entry(FakeObject* self, long long a, long long b) {
+  *self = {self->table, Slot, a, b};
   return 0;
 }
 
@@ -32,37 +29,25 @@ void FillTable(void** table, std::integer_sequence<int, Slots...>) {
   ((table[Slots] = reinterpret_cast<void*>(&Entry<Slots>)), ...);
 }
 
-TEST(CommInterface, CallsReachTheirTablePositionsWithTheirArguments) {
+TEST(CommInterface, CallsReachTheirTablePositions) {
   void* table[14];
   FillTable(table, std::make_integer_sequence<int, 14>());
   FakeObject fake{table};
   auto* comm = reinterpret_cast<IMarlixComm*>(&fake);
-
-  comm->SetCommParameters(3, 19200, 2, 1, 1, 7, 0);
-  EXPECT_EQ(fake.lastSlot, 2);
-  EXPECT_EQ(fake.args[0], 3);
-  EXPECT_EQ(fake.args[1], 19200);
-  EXPECT_EQ(static_cast<int>(fake.args[6]), 0);
-  comm->Initialize();
-  EXPECT_EQ(fake.lastSlot, 3);
-  comm->ReceiveFile(20, true);
-  EXPECT_EQ(fake.lastSlot, 4);
-  EXPECT_EQ(static_cast<int>(fake.args[0]), 20);
-  EXPECT_EQ(static_cast<unsigned char>(fake.args[1]), 1);
-  comm->SetPoints(nullptr);
-  EXPECT_EQ(fake.lastSlot, 6);
-  comm->TerminateConnection();
-  EXPECT_EQ(fake.lastSlot, 8);
-  comm->SetFilePath("x");
-  EXPECT_EQ(fake.lastSlot, 9);
-  comm->SetTimeout(30);
-  EXPECT_EQ(fake.lastSlot, 10);
-  EXPECT_EQ(static_cast<int>(fake.args[0]), 30);
-  comm->SetCallback(&CommResultCallback);
-  EXPECT_EQ(fake.lastSlot, 13);
-  comm->Destroy(1);
-  EXPECT_EQ(fake.lastSlot, 0);
-  EXPECT_EQ(static_cast<unsigned>(fake.args[0]), 1u);
+  auto expect = [&](int slot, long long first) {
+    EXPECT_EQ(fake.slot, slot);
+    EXPECT_EQ(static_cast<int>(fake.first), first);
+  };
+  comm->SetCommParameters(3, 19200, 2, 1, 1, 7, 0); expect(2, 3);
+  comm->Initialize(); EXPECT_EQ(fake.slot, 3);
+  comm->ReceiveFile(20, true); expect(4, 20);
+  EXPECT_EQ(static_cast<unsigned char>(fake.second), 1);
+  comm->SetPoints(nullptr); expect(6, 0);
+  comm->TerminateConnection(); EXPECT_EQ(fake.slot, 8);
+  comm->SetFilePath("x"); EXPECT_EQ(fake.slot, 9);
+  comm->SetTimeout(30); expect(10, 30);
+  comm->SetCallback(&CommResultCallback); EXPECT_EQ(fake.slot, 13);
+  comm->Destroy(1); expect(0, 1);
 }
 
 TEST(CommInterface, ResultCodesMapToTheirTexts) {
@@ -73,18 +58,7 @@ TEST(CommInterface, ResultCodesMapToTheirTexts) {
   EXPECT_EQ(CommResultText(-204), L"The checksum is incorrect");
   EXPECT_EQ(CommResultText(-301), L"Temporary file open error");
   EXPECT_EQ(CommResultText(-302), L"Point name or memo is wrong");
-  for (int code : {1, 101, -200, -205, -303, INT_MIN, INT_MAX}) EXPECT_EQ(CommResultText(code), L"Unknown error");
-}
-
-TEST(CommInterface, LastErrorBecomesAWin32FailureCodeOnlyWhenPositive) {
-  EXPECT_EQ(LastErrorToFailureCode(ERROR_MOD_NOT_FOUND), static_cast<HRESULT>(0x8007007E));
-  EXPECT_EQ(LastErrorToFailureCode(0x0001FFFF), static_cast<HRESULT>(0x8007FFFF));
-  EXPECT_EQ(LastErrorToFailureCode(0), 0);
-  EXPECT_EQ(LastErrorToFailureCode(0xC0000135), static_cast<HRESULT>(0xC0000135));
-}
-
-LRESULT CALLBACK RecordingProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
-  return DefWindowProcW(window, message, wParam, lParam);
+  for (int code : {1, 101, -200, -205, -303, INT_MIN}) EXPECT_EQ(CommResultText(code), L"Unknown error");
 }
 
 DWORD WINAPI CallbackFromAnotherThread(void*) {
@@ -93,23 +67,14 @@ DWORD WINAPI CallbackFromAnotherThread(void*) {
 }
 
 TEST(CommInterface, CallbackPostsTheSignExtendedCodeToTheOpenDialogOnly) {
-  WNDCLASSW wc{};
-  wc.lpfnWndProc = RecordingProc;
-  wc.hInstance = GetModuleHandleW(nullptr);
-  wc.lpszClassName = L"CommCallbackTarget";
-  RegisterClassW(&wc);
-  HWND target = CreateWindowExW(0, wc.lpszClassName, L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr,
-                                wc.hInstance, nullptr);
+  HWND target = CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, nullptr, nullptr);
   ASSERT_NE(target, nullptr);
-
   MSG message;
-  DownloadDialogWindow = nullptr;
-  CommResultCallback(5);  // would land in this thread's queue if it posted to a null window
+  CommResultCallback(5);  // no dialog: a post to a null window would land in this thread's queue
   EXPECT_FALSE(PeekMessageW(&message, nullptr, DownloadMessage, DownloadMessage, PM_REMOVE));
 
   DownloadDialogWindow = target;
   HANDLE thread = CreateThread(nullptr, 0, CallbackFromAnotherThread, nullptr, 0, nullptr);
-  ASSERT_NE(thread, nullptr);
   WaitForSingleObject(thread, 10000);
   CloseHandle(thread);
   DownloadDialogWindow = nullptr;
@@ -119,34 +84,26 @@ TEST(CommInterface, CallbackPostsTheSignExtendedCodeToTheOpenDialogOnly) {
   DestroyWindow(target);
 }
 
-TEST(CommInterface, PointsBlockPresetsBothFieldsOfEveryRecord) {
-  PointsBlock* block = NewPointsBlock();
-  ASSERT_NE(block, nullptr);
-  const auto* bytes = reinterpret_cast<const unsigned char*>(block);
-  for (size_t record = 0; record < kPointRecordCount; ++record) {
-    int32_t first, second;
-    std::memcpy(&first, bytes + record * 144 + 20, 4);
-    std::memcpy(&second, bytes + record * 144 + 92, 4);
-    ASSERT_EQ(first, -1) << record;
-    ASSERT_EQ(second, -1) << record;
-  }
-  DeletePointsBlock(block);
-  DeletePointsBlock(nullptr);
-}
-
 TEST(CommInterface, TargetPathIsAFreshTkfNameWithoutExtensionInTheTempFolder) {
   std::wstring first, second;
   ASSERT_EQ(MakeDownloadTargetPath(first), 0u);
   ASSERT_EQ(MakeDownloadTargetPath(second), 0u);
   wchar_t temp[MAX_PATH] = {};
   GetTempPathW(MAX_PATH, temp);
-  EXPECT_EQ(first.rfind(temp, 0), 0u) << first;
+  ASSERT_EQ(first.rfind(temp, 0), 0u) << first;
   std::wstring name = first.substr(wcslen(temp));
   EXPECT_EQ(name.rfind(L"TKF", 0), 0u);
   EXPECT_EQ(name.find(L'.'), std::wstring::npos);
-  EXPECT_EQ(GetFileAttributesW((first + L".tmp").c_str()), INVALID_FILE_ATTRIBUTES);
-  EXPECT_EQ(GetFileAttributesW((first + L".TMP").c_str()), INVALID_FILE_ATTRIBUTES);
+  EXPECT_EQ(GetFileAttributesW((first + L".tmp").c_str()), INVALID_FILE_ATTRIBUTES);  // deleted again
   EXPECT_NE(first, second);
+}
+
+TEST(CommInterface, MessagesAreRegisteredUnderTheirProtocolTexts) {
+  EXPECT_EQ(GlobalNotifyMessage, RegisterWindowMessageW(L"TSShell Extension - Global Notify"));
+  EXPECT_EQ(DownloadMessage, RegisterWindowMessageW(L"Marlix Total Stations Shell Extension - Download Message"));
+  EXPECT_EQ(UploadMessage, RegisterWindowMessageW(L"Marlix Total Stations Shell Extension - Upload Message"));
+  EXPECT_EQ(GetEnumIDListMessage, RegisterWindowMessageW(L"KLD Shell Extension - Get EnumIDList"));
+  EXPECT_GE(GlobalNotifyMessage, 0xC000u);
 }
 
 }  // namespace

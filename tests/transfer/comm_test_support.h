@@ -1,5 +1,5 @@
-// Helpers for tests that drive the download dialog as a person would, from a second
-// thread, against the stand-in library beside the test program.
+// Drives the download dialog as a person would, from a second thread, against the
+// stand-in library beside the test program.
 #pragma once
 #include <windows.h>
 #include <functional>
@@ -8,38 +8,29 @@
 
 namespace commtest {
 
-// The folder of this test program, with a trailing backslash.
-std::wstring ProgramFolder();
+std::wstring ProgramFolder();  // with a trailing backslash
 
 // Writes MarlixComm.txt beside the program and empties MarlixComm.log.
 void ConfigureStandIn(const std::string& settings);
-// The lines of MarlixComm.log.
 std::vector<std::string> StandInLog();
 void AppendStandInLog(const std::string& line);
 
-// Runs `script` on a second thread while the calling thread runs `modal`; returns what
-// `modal` returned. If the script ends with the dialog still open, or a wait times out,
-// the dialog is closed by force so the test cannot hang.
+// Runs `script` on a second thread while this thread runs `modal`. Whatever the script
+// leaves open is closed by force afterwards, so a failing test cannot hang.
 INT_PTR RunWithDriver(const std::function<INT_PTR()>& modal, const std::function<void()>& script);
 
-// Calls from the driver thread. Waits give up after `timeoutMs`.
-HWND WaitForDialog(DWORD timeoutMs = 10000);
+// Driver calls; every wait gives up after 10 s.
+HWND WaitForDialog();
 std::wstring ControlText(HWND dialog, int id);
-bool WaitForControlText(HWND dialog, int id, const std::wstring& text, DWORD timeoutMs = 10000);
+bool WaitForControlText(HWND dialog, int id, const std::wstring& text);
 void Click(HWND dialog, int id);
-// A message box owned by `owner`, or null after the timeout.
-HWND WaitForMessageBox(HWND owner, DWORD timeoutMs = 10000);
+HWND WaitForMessageBox(HWND owner);  // null if none came
 std::wstring MessageBoxText(HWND box);
 void PressOk(HWND box);
-bool WaitUntilGone(HWND window, DWORD timeoutMs = 10000);
+bool WaitUntilGone(HWND window);
 
-// Copies this program (and optionally a DLL as MarlixComm.dll) into a new folder, runs the
-// one test `filter` there and returns its exit code (-1 if it could not run or hung).
-int RunCopyOfProgram(const std::wstring& folderName, const std::wstring& dllToCopy,
-                     const std::string& filter);
-
-// Whether the named file exists.
-bool FileExistsAt(const std::wstring& path);
-ULONGLONG FileSizeAt(const std::wstring& path);
+// Copies this program (and a DLL as MarlixComm.dll, unless empty) into a folder of its
+// own and runs the one test `filter` there. Its exit code, or -1.
+int RunCopyOfProgram(const std::wstring& folderName, const std::wstring& dll, const std::string& filter);
 
 }  // namespace commtest

@@ -175,7 +175,7 @@ HRESULT CMarlixDLDataObject::GetIdListArray(STGMEDIUM& medium) {
       LPCITEMIDLIST child = pidl.GetLast(ItemList[i]);
       UINT childSize = pidl.GetSize(child);
       cida->aoffset[i + 1] = offset;
-      memcpy(base + offset, child, childSize);
+      if (child) memcpy(base + offset, child, childSize);
       offset += childSize;
     }
   }

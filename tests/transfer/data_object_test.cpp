@@ -6,7 +6,6 @@
 
 #include "data_test_support.h"
 #include "helpers/win_handles.h"
-#include "server/class_creators.h"
 #include "server/com_base.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
@@ -149,11 +148,6 @@ TEST_F(DataObject, QueriesEnumerationAndSetData) {
   EXPECT_EQ(obj->GetData(&text, &m_), E_INVALIDARG);
   EXPECT_EQ(obj->QueryGetData(&text), S_FALSE);
   ReleaseStgMedium(&given);
-
-  com::ComPtr<IDropSource> made;
-  EXPECT_EQ(CreateMarlixDLDataObject(IID_IDropSource, made.PutVoid()), S_OK);
-  com::ComPtr<IStream> none;
-  EXPECT_EQ(CreateMarlixDLDataObject(IID_IStream, none.PutVoid()), E_NOINTERFACE);
 }
 
 TEST_F(DataObject, ContentsRefusedBeforeAnyDialog) {
@@ -184,13 +178,11 @@ TEST_F(DataObject, ContentsRefusedBeforeAnyDialog) {
   DownloadDialogWindow = nullptr;
 }
 
-std::vector<char> ReadAll(IStream* stream, ULONG block) {
-  std::vector<char> bytes(block), all;
-  ULONG got = 0;
-  do {
-    if (stream->Read(bytes.data(), block, &got) != S_OK) break;
-    all.insert(all.end(), bytes.begin(), bytes.begin() + got);
-  } while (got == block);
+std::vector<char> ReadAll(IStream* stream) {
+  std::vector<char> all;
+  char block[4096];
+  for (ULONG got = sizeof block; got == sizeof block && stream->Read(block, sizeof block, &got) == S_OK;)
+    all.insert(all.end(), block, block + got);
   return all;
 }
 
@@ -215,7 +207,7 @@ TEST_F(DataObject, DownloadWhileOtherRequestsAreRefused) {
   ASSERT_EQ(m_.tymed, DWORD(TYMED_ISTREAM));
   EXPECT_EQ(m_.pUnkForRelease, nullptr);
   EXPECT_EQ(TransferFiles().size(), before.size() + 1) << "the received .txt waits";
-  EXPECT_TRUE(IsStandInJob(ReadAll(m_.pstm, 4096)));
+  EXPECT_TRUE(IsStandInJob(ReadAll(m_.pstm)));
   EXPECT_EQ(TransferFiles(), before) << "the short read deleted it";
   char more[4];
   ULONG got = 9;
@@ -255,11 +247,7 @@ TEST_F(DataObject, DragPictureIsCleanedOnlyWhenNothingIsHeld) {
   HWND list = CreateWindowExW(0, L"STATIC", L"", WS_POPUP | WS_VISIBLE, 0, 0, 50, 50, nullptr, nullptr,
                               nullptr, nullptr);
   HIMAGELIST image = ImageList_Create(16, 16, ILC_COLOR32, 1, 1);
-  HDC screen = GetDC(nullptr);
-  HBITMAP bitmap = CreateCompatibleBitmap(screen, 16, 16);
-  ReleaseDC(nullptr, screen);
-  ImageList_Add(image, bitmap, nullptr);
-  DeleteObject(bitmap);
+  ImageList_ReplaceIcon(image, -1, LoadIconW(nullptr, IDI_APPLICATION));
   obj->SetDragImage(image, list, POINT{-3, -4});
   EXPECT_EQ(obj->GiveFeedback(DROPEFFECT_COPY), DRAGDROP_S_USEDEFAULTCURSORS);
   EXPECT_TRUE(obj->DragImageShown);

@@ -13,79 +13,60 @@
 
 namespace {
 
-TEST(ImageLists, HoldTheThreePicturesAtBothSizes) {
-  LoadImageLists();
-  LoadImageLists();  // a second load replaces the lists
-  ASSERT_TRUE(LargeImageList && SmallImageList);
-  EXPECT_EQ(ImageList_GetImageCount(LargeImageList), 3);
-  EXPECT_EQ(ImageList_GetImageCount(SmallImageList), 3);
-  int cx = 0, cy = 0;
-  ImageList_GetIconSize(LargeImageList, &cx, &cy);
-  EXPECT_EQ(cx, GetSystemMetrics(SM_CXICON));
-  EXPECT_EQ(cy, GetSystemMetrics(SM_CYICON));
-  ImageList_GetIconSize(SmallImageList, &cx, &cy);
-  EXPECT_EQ(cx, GetSystemMetrics(SM_CXSMICON));
-  EXPECT_EQ(cy, GetSystemMetrics(SM_CYSMICON));
-  DestroyImageLists();
-  EXPECT_FALSE(LargeImageList || SmallImageList);
-}
-
-TEST(IconObject, IndexFollowsTheLastIdAndIconsComeFromTheLists) {
+TEST(ItemObjects, ImageListsHoldThreePicturesAtBothSizesAndIconsComeFromThem) {
   long before = com::ModuleLockCount();
   {
+    LoadImageLists();
+    LoadImageLists();  // a second load replaces the lists
+    ASSERT_TRUE(LargeImageList && SmallImageList);
+    for (auto [list, x, y] : {std::tuple{LargeImageList, SM_CXICON, SM_CYICON},
+                               std::tuple{SmallImageList, SM_CXSMICON, SM_CYSMICON}}) {
+      int cx = 0, cy = 0;
+      EXPECT_EQ(ImageList_GetImageCount(list), 3);
+      ImageList_GetIconSize(list, &cx, &cy);
+      EXPECT_EQ(cx, GetSystemMetrics(x));
+      EXPECT_EQ(cy, GetSystemMetrics(y));
+    }
+    // The index follows the last id; a relative list has no parent id.
     auto icon = com::Make<CMarlixDLExtractIcon>();
-    struct Case { const wchar_t* path; int index; };
-    for (Case c : {Case{L"Marlix Digital Levels\\Alpha", 0}, Case{L"Marlix Digital Levels\\Alpha\\file1.tkf", 2},
-                   Case{L"Marlix Digital Levels", 1}}) {
-      UniqueList full = MakeFull(c.path);
-      ASSERT_TRUE(icon->SetItem(full.Get()));
-      int index = -1;
+    struct Row { UniqueList list; int index; } rows[] = {
+        {MakeFull(L"Marlix Digital Levels\\Alpha"), 0}, {MakeFull(L"Marlix Digital Levels"), 1},
+        {MakeFull(L"Marlix Digital Levels\\Alpha\\file1.tkf"), 2}, {MakeId(PIDL_LEVEL, L"Beta"), 0}};
+    for (Row& row : rows) {
+      SCOPED_TRACE(testing::Message() << "row " << &row - rows);
+      ASSERT_TRUE(icon->SetItem(row.list.Get()));
+      int index = -1, again = -1;
       UINT flags = 0;
-      wchar_t file[8] = L"keep";
+      wchar_t file[8] = L"keep";  // not written to
       EXPECT_EQ(icon->GetIconLocation(GIL_FORSHELL, file, 8, &index, &flags), S_OK);
-      EXPECT_EQ(index, c.index) << c.path;
       EXPECT_EQ(flags, static_cast<UINT>(GIL_NOTFILENAME));
+      icon->GetIconLocation(0, nullptr, 0, &again, &flags);
+      EXPECT_EQ(index, row.index);
+      EXPECT_EQ(again, row.index);
       EXPECT_STREQ(file, L"keep");
     }
-    UniqueList level = MakeId(PIDL_LEVEL, L"Beta");  // a relative list has no parent id
-    ASSERT_TRUE(icon->SetItem(level.Get()));
-    int index = -1;
-    UINT flags = 0;
-    icon->GetIconLocation(0, nullptr, 0, &index, &flags);
-    EXPECT_EQ(index, 0);
-
-    LoadImageLists();
     HICON large = nullptr, small = nullptr;
     EXPECT_EQ(icon->Extract(nullptr, 2, &large, &small, MAKELONG(48, 16)), S_OK);
-    ICONINFO info{};
-    ASSERT_TRUE(large && small);
-    ASSERT_TRUE(GetIconInfo(large, &info));
+    win::UniqueIcon largeIcon(large), smallIcon(small);
+    ICONINFO parts{};
     BITMAP bitmap{};
-    GetObjectW(info.hbmColor ? info.hbmColor : info.hbmMask, sizeof(bitmap), &bitmap);
+    ASSERT_TRUE(small && GetIconInfo(large, &parts));
+    GetObjectW(parts.hbmColor ? parts.hbmColor : parts.hbmMask, sizeof(bitmap), &bitmap);
+    DeleteObject(parts.hbmColor);
+    DeleteObject(parts.hbmMask);
     EXPECT_EQ(bitmap.bmWidth, GetSystemMetrics(SM_CXICON)) << "the size asked for is not looked at";
-    DeleteObject(info.hbmColor);
-    DeleteObject(info.hbmMask);
-    DestroyIcon(large);
-    DestroyIcon(small);
     EXPECT_EQ(icon->Extract(nullptr, 9, &large, &small, 0), S_OK);
     EXPECT_FALSE(large || small);
     DestroyImageLists();
-  }
-  EXPECT_EQ(com::ModuleLockCount(), before);
-}
-
-TEST(QueryInfo, TipIsThePathOfTheFullList) {
-  long before = com::ModuleLockCount();
-  {
+    EXPECT_FALSE(LargeImageList || SmallImageList);
     auto info = com::Make<CMarlixDLQueryInfo>();
     UniqueList full = MakeFull(L"Marlix Digital Levels\\Gone level\\file1.tkf");
     ASSERT_TRUE(info->SetItem(full.Get()));
     win::UniqueCoMem<wchar_t> tip;
     EXPECT_EQ(info->GetInfoTip(0, tip.Put()), S_OK);
-    EXPECT_STREQ(tip.Get(), L"Marlix Digital Levels\\Gone level\\file1.tkf");
+    EXPECT_STREQ(tip.Get(), L"Marlix Digital Levels\\Gone level\\file1.tkf") << "the tip is the full list's path";
     DWORD flags = 0;
     EXPECT_EQ(info->GetInfoFlags(&flags), E_NOTIMPL);
-
     com::ComPtr<IQueryInfo> made;
     EXPECT_EQ(CreateMarlixDLQueryInfo(IID_IQueryInfo, made.PutVoid()), S_OK);
     EXPECT_EQ(made->GetInfoTip(0, tip.Put()), S_OK) << "no list: an empty tip";
@@ -94,7 +75,7 @@ TEST(QueryInfo, TipIsThePathOfTheFullList) {
   EXPECT_EQ(com::ModuleLockCount(), before);
 }
 
-TEST(ContextMenu, OneSampleEntryAndNarrowTextsInWideBuffers) {
+TEST(ItemObjects, ContextMenuHasOneSampleEntryAndPutsNarrowTextsInWideBuffers) {
   auto menu = com::Make<CMarlixDLContextMenu>();
   win::UniqueMenu popup(CreatePopupMenu());
   EXPECT_EQ(menu->QueryContextMenu(popup.Get(), 0, 100, 200, CMF_DEFAULTONLY), S_OK);
@@ -107,34 +88,27 @@ TEST(ContextMenu, OneSampleEntryAndNarrowTextsInWideBuffers) {
   EXPECT_EQ(GetMenuItemID(popup.Get(), 0), 100u);
 
   char buffer[64];
-  std::memset(buffer, 'x', sizeof(buffer));
-  EXPECT_EQ(menu->GetCommandString(0, GCS_VERBW, nullptr, buffer, 32), S_OK);
-  EXPECT_EQ(std::memcmp(buffer, "command\0x", 9), 0) << "eight bytes, nothing more";
-  std::memset(buffer, 'x', sizeof(buffer));
-  EXPECT_EQ(menu->GetCommandString(0, GCS_HELPTEXTW, nullptr, buffer, 32), S_OK);
-  EXPECT_EQ(std::memcmp(buffer, "Explorer Bar command help text\0x", 32), 0);
-  EXPECT_EQ(menu->GetCommandString(1, GCS_VERBW, nullptr, buffer, 32), E_INVALIDARG);
-  EXPECT_EQ(menu->GetCommandString(1, GCS_HELPTEXTW, nullptr, buffer, 32), E_INVALIDARG);
+  for (auto [type, text, size] : {std::tuple{GCS_VERBW, "command\0x", 9},
+                                     std::tuple{GCS_HELPTEXTW, "Explorer Bar command help text\0x", 32}}) {
+    std::memset(buffer, 'x', sizeof(buffer));
+    EXPECT_EQ(menu->GetCommandString(0, type, nullptr, buffer, 32), S_OK);
+    EXPECT_EQ(std::memcmp(buffer, text, size), 0) << text << ": the narrow text and its terminator, nothing more";
+    EXPECT_EQ(menu->GetCommandString(1, type, nullptr, buffer, 32), E_INVALIDARG);
+  }
   EXPECT_EQ(menu->GetCommandString(5, GCS_VALIDATEW, nullptr, buffer, 32), S_OK);
   for (UINT narrow : {GCS_VERBA, GCS_HELPTEXTA, GCS_VALIDATEA})
     EXPECT_EQ(menu->GetCommandString(0, narrow, nullptr, buffer, 32), E_INVALIDARG);
 
   CMINVOKECOMMANDINFO info{sizeof(info)};
-  info.lpVerb = "open";
-  EXPECT_EQ(menu->InvokeCommand(&info), E_INVALIDARG);
-  info.lpVerb = MAKEINTRESOURCEA(1);
-  EXPECT_EQ(menu->InvokeCommand(&info), E_INVALIDARG);
-
+  for (LPCSTR verb : {LPCSTR("open"), LPCSTR(MAKEINTRESOURCEA(1))}) {
+    info.lpVerb = verb;
+    EXPECT_EQ(menu->InvokeCommand(&info), E_INVALIDARG);
+  }
   // Offset 0 shows the sample message; a helper thread answers it.
   std::atomic<bool> seen{false};
   std::thread closer([&] {
-    for (int i = 0; i < 500 && !seen; ++i) {
-      if (HWND box = FindWindowW(nullptr, L"Sample Explorer Bar")) {
-        seen = true;
-        PostMessageW(box, WM_COMMAND, IDOK, 0);
-      }
-      Sleep(10);
-    }
+    for (int i = 0; i < 500 && !seen; ++i, Sleep(10))
+      if (HWND box = FindWindowW(nullptr, L"Sample Explorer Bar")) seen = PostMessageW(box, WM_COMMAND, IDOK, 0);
   });
   info.lpVerb = nullptr;
   EXPECT_EQ(menu->InvokeCommand(&info), S_OK);

@@ -1,31 +1,53 @@
 #include "shell/shell_test_util.h"
 
+#include <gtest/gtest.h>
+
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
 
 UniqueList MakeId(tagPIDLTYPE type, const wchar_t* text) {
-  CPidlMgr mgr;
-  return UniqueList(mgr.CreateItem(type, text, static_cast<UINT>((wcslen(text) + 1) * sizeof(wchar_t))));
+  return UniqueList(CPidlMgr().CreateItem(type, text, static_cast<UINT>((wcslen(text) + 1) * sizeof(wchar_t))));
 }
-
 UniqueList MakeFull(const wchar_t* path) { return UniqueList(CPidlMgr().CreateListFromPath(path)); }
 
 void SeedLevel(int n, const std::wstring& name) {
   RegWriteString(HKEY_CURRENT_USER, GetLevelsKeyName() + L"\\Station " + std::to_wstring(n), L"Name", name);
 }
 
-std::vector<std::pair<tagPIDLTYPE, std::wstring>> Ids(LPCITEMIDLIST list) {
-  std::vector<std::pair<tagPIDLTYPE, std::wstring>> ids;
+IdList Ids(LPCITEMIDLIST list) {
+  IdList ids;
   for (LPCITEMIDLIST id = list; id && IdSize(id) != 0;
        id = reinterpret_cast<LPCITEMIDLIST>(reinterpret_cast<const BYTE*>(id) + IdSize(id)))
     ids.emplace_back(CPidlMgr::GetType(id), CPidlMgr::GetTextCopy(id));
   return ids;
 }
 
-std::wstring TakeStrRet(STRRET& strret) {
+std::vector<UniqueList> Drain(IEnumIDList* list) {
+  std::vector<UniqueList> items;
+  LPITEMIDLIST item = nullptr;
+  ULONG fetched = list ? 7 : 0;
+  while (list && list->Next(1, &item, &fetched) == S_OK) items.emplace_back(item);
+  EXPECT_EQ(fetched, 0u);
+  return items;
+}
+
+std::vector<UniqueList> Enum(IShellFolder* folder, SHCONTF flags) {
+  com::ComPtr<IEnumIDList> list;
+  EXPECT_EQ(folder->EnumObjects(nullptr, flags, list.Put()), S_OK);
+  return Drain(list.Get());
+}
+
+com::ComPtr<IShellFolder> Bind(IShellFolder* parent, LPCITEMIDLIST item) {
+  com::ComPtr<IShellFolder> child;
+  EXPECT_EQ(parent->BindToObject(item, nullptr, IID_IShellFolder, child.PutVoid()), S_OK);
+  return child;
+}
+
+std::wstring Name(IShellFolder* folder, LPCITEMIDLIST item, SHGDNF flags, HRESULT* hr) {
+  STRRET strret{};
+  HRESULT result = folder->GetDisplayNameOf(item, flags, &strret);
+  if (hr) *hr = result;
+  if (FAILED(result)) return L"<failed>";
   if (strret.uType != STRRET_WSTR || !strret.pOleStr) return L"<not a wide string>";
-  std::wstring text = strret.pOleStr;
-  CoTaskMemFree(strret.pOleStr);
-  strret.pOleStr = nullptr;
-  return text;
+  return win::UniqueCoMem<wchar_t>(strret.pOleStr).Get();
 }

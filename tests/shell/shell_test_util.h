@@ -6,17 +6,19 @@
 #include <vector>
 
 #include "helpers/win_handles.h"
+#include "server/com_base.h"
 #include "store/pidl_manager.h"
 
 using UniqueList = win::UniqueCoMem<ITEMIDLIST>;
+using IdList = std::vector<std::pair<tagPIDLTYPE, std::wstring>>;
+const std::wstring kParsingRoot = L"::{D8B818CA-E47C-49a1-96A5-C2AA5FB57F15}";
 
-// One id of `type` with `text`.
 UniqueList MakeId(tagPIDLTYPE type, const wchar_t* text);
-// The full list of a path text such as L"Marlix Digital Levels\\Alpha\\file1.tkf".
-UniqueList MakeFull(const wchar_t* path);
-// Adds a level key "Station <n>" with a "Name" under the current user's store.
-void SeedLevel(int n, const std::wstring& name);
-// Type and text of every id of a list.
-std::vector<std::pair<tagPIDLTYPE, std::wstring>> Ids(LPCITEMIDLIST list);
-// Takes the text out of a STRRET_WSTR and frees it.
-std::wstring TakeStrRet(STRRET& strret);
+UniqueList MakeFull(const wchar_t* path);  // e.g. L"Marlix Digital Levels\\Alpha\\file1.tkf"
+void SeedLevel(int n, const std::wstring& name);  // a level key "Station <n>" with a "Name" in the user's store
+IdList Ids(LPCITEMIDLIST list);  // type and text of every id
+std::vector<UniqueList> Drain(IEnumIDList* list);  // checks the last Next reports none fetched
+std::vector<UniqueList> Enum(IShellFolder* folder, SHCONTF flags);
+com::ComPtr<IShellFolder> Bind(IShellFolder* parent, LPCITEMIDLIST item);
+// A display name, which must come as a wide string; "<failed>" if the call fails.
+std::wstring Name(IShellFolder* folder, LPCITEMIDLIST item, SHGDNF flags, HRESULT* hr = nullptr);

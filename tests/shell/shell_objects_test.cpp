@@ -15,10 +15,31 @@
 #include "support/registry_sandbox.h"
 
 namespace {
-
 std::wstring Path(IShellFolder* folder, bool parsing) {
   wchar_t path[MAX_PATH];
   return static_cast<CMarlixDLShellFolder*>(folder)->GetFolderPath(path, MAX_PATH, parsing) ? path : L"<failed>";
+}
+
+const wchar_t kRoot[] = L"\\Marlix Digital Levels";
+using Texts = std::vector<std::wstring>;
+
+// An enumerator; null if Create failed (the object is gone then).
+com::ComPtr<CMarlixDLEnumIDList> Enumerate(const wchar_t* path, DWORD flags, HRESULT expected = S_OK) {
+  auto* list = new CMarlixDLEnumIDList();
+  HRESULT hr = E_UNEXPECTED;
+  list->Create(path, flags, &hr);
+  EXPECT_EQ(hr, expected) << path;
+  return SUCCEEDED(hr) ? com::ComPtr<CMarlixDLEnumIDList>::Attach(list) : nullptr;
+}
+
+// "type:text" of each remaining item, each a single id.
+Texts Walk(IEnumIDList* list) {
+  Texts texts;
+  for (const UniqueList& item : Drain(list)) {
+    IdList ids = Ids(item.Get());
+    texts.push_back(ids.size() == 1 ? std::to_wstring(ids[0].first) + L":" + ids[0].second : L"<not one id>");
+  }
+  return texts;
 }
 
 // An empty store; by the end of a test every object must have let go of the module.
@@ -161,28 +182,6 @@ TEST_F(ShellFolder, HandsOutObjectsWithTheItemsFullList) {
   EXPECT_FALSE(other);
 }
 
-const wchar_t kRoot[] = L"\\Marlix Digital Levels";
-using Texts = std::vector<std::wstring>;
-
-// An enumerator; null if Create failed (the object is gone then).
-com::ComPtr<CMarlixDLEnumIDList> Enumerate(const wchar_t* path, DWORD flags, HRESULT expected = S_OK) {
-  auto* list = new CMarlixDLEnumIDList();
-  HRESULT hr = E_UNEXPECTED;
-  list->Create(path, flags, &hr);
-  EXPECT_EQ(hr, expected) << path;
-  return SUCCEEDED(hr) ? com::ComPtr<CMarlixDLEnumIDList>::Attach(list) : nullptr;
-}
-
-// "type:text" of each remaining item, each a single id.
-Texts Walk(IEnumIDList* list) {
-  Texts texts;
-  for (const UniqueList& item : Drain(list)) {
-    IdList ids = Ids(item.Get());
-    texts.push_back(ids.size() == 1 ? std::to_wstring(ids[0].first) + L":" + ids[0].second : L"<not one id>");
-  }
-  return texts;
-}
-
 TEST_F(Shell, EnumeratorListsLevelsInRegistryOrderAndTheLevelsOneFile) {
   SeedLevel(0, L"Alpha");
   SeedLevel(1, L"beta");
@@ -264,8 +263,7 @@ TEST_F(Shell, ImageListsHoldThreePicturesAtBothSizesAndIconsComeFromThem) {
     int cx = 0, cy = 0;
     EXPECT_EQ(ImageList_GetImageCount(list), 3);
     ImageList_GetIconSize(list, &cx, &cy);
-    EXPECT_EQ(cx, GetSystemMetrics(x));
-    EXPECT_EQ(cy, GetSystemMetrics(y));
+    EXPECT_EQ(std::make_pair(cx, cy), std::make_pair(GetSystemMetrics(x), GetSystemMetrics(y)));
   }
   // The index follows the last id; a relative list has no parent id.
   auto icon = com::Make<CMarlixDLExtractIcon>();
@@ -281,8 +279,7 @@ TEST_F(Shell, ImageListsHoldThreePicturesAtBothSizesAndIconsComeFromThem) {
     EXPECT_EQ(icon->GetIconLocation(GIL_FORSHELL, file, 8, &index, &flags), S_OK);
     EXPECT_EQ(flags, static_cast<UINT>(GIL_NOTFILENAME));
     icon->GetIconLocation(0, nullptr, 0, &again, &flags);
-    EXPECT_EQ(index, row.index);
-    EXPECT_EQ(again, row.index);
+    EXPECT_EQ(std::make_pair(index, again), std::make_pair(row.index, row.index)) << "with and without a buffer";
     EXPECT_STREQ(file, L"keep");
   }
   HICON large = nullptr, small = nullptr;
@@ -303,9 +300,9 @@ TEST_F(Shell, ImageListsHoldThreePicturesAtBothSizesAndIconsComeFromThem) {
   com::ComPtr<IQueryInfo> made;
   ASSERT_EQ(CreateMarlixDLQueryInfo(IID_IQueryInfo, made.PutVoid()), S_OK);
   win::UniqueCoMem<wchar_t> tip;
+  DWORD flags = 0;
   EXPECT_EQ(made->GetInfoTip(0, tip.Put()), S_OK);
   EXPECT_STREQ(tip.Get(), L"");
-  DWORD flags = 0;
   EXPECT_EQ(made->GetInfoFlags(&flags), E_NOTIMPL);
 }
 
@@ -347,5 +344,4 @@ TEST_F(Shell, ContextMenuHasOneSampleEntryAndPutsNarrowTextsInWideBuffers) {
   closer.join();
   EXPECT_TRUE(seen);
 }
-
 }  // namespace

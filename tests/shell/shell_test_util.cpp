@@ -13,7 +13,6 @@ UniqueList MakeFull(const wchar_t* path) { return UniqueList(CPidlMgr().CreateLi
 void SeedLevel(int n, const std::wstring& name) {
   RegWriteString(HKEY_CURRENT_USER, GetLevelsKeyName() + L"\\Station " + std::to_wstring(n), L"Name", name);
 }
-
 IdList Ids(LPCITEMIDLIST list) {
   IdList ids;
   for (LPCITEMIDLIST id = list; id && IdSize(id) != 0;
@@ -21,7 +20,6 @@ IdList Ids(LPCITEMIDLIST list) {
     ids.emplace_back(CPidlMgr::GetType(id), CPidlMgr::GetTextCopy(id));
   return ids;
 }
-
 std::vector<UniqueList> Drain(IEnumIDList* list) {
   std::vector<UniqueList> items;
   LPITEMIDLIST item = nullptr;
@@ -30,19 +28,16 @@ std::vector<UniqueList> Drain(IEnumIDList* list) {
   EXPECT_EQ(fetched, 0u);
   return items;
 }
-
 std::vector<UniqueList> Enum(IShellFolder* folder, SHCONTF flags) {
   com::ComPtr<IEnumIDList> list;
   EXPECT_EQ(folder->EnumObjects(nullptr, flags, list.Put()), S_OK);
   return Drain(list.Get());
 }
-
 com::ComPtr<IShellFolder> Bind(IShellFolder* parent, LPCITEMIDLIST item) {
   com::ComPtr<IShellFolder> child;
   EXPECT_EQ(parent->BindToObject(item, nullptr, IID_IShellFolder, child.PutVoid()), S_OK);
   return child;
 }
-
 std::wstring Name(IShellFolder* folder, LPCITEMIDLIST item, SHGDNF flags, HRESULT* hr) {
   STRRET strret{};
   HRESULT result = folder->GetDisplayNameOf(item, flags, &strret);

@@ -1,10 +1,8 @@
 #pragma once
 #include <windows.h>
 #include <shlobj.h>
-
 #include <string>
 #include <vector>
-
 #include "helpers/win_handles.h"
 #include "server/com_base.h"
 #include "store/pidl_manager.h"

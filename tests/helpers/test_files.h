@@ -1,37 +1,39 @@
 // Scratch files for the support library's tests.
 #pragma once
 #include <windows.h>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
 #include <string>
 
 namespace testfiles {
 
 inline void WriteBytes(const std::wstring& path, const std::string& bytes) {
-  HANDLE h = CreateFileW(path.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, 0, nullptr);
-  DWORD written = 0;
-  if (h != INVALID_HANDLE_VALUE) {
-    if (!bytes.empty()) WriteFile(h, bytes.data(), static_cast<DWORD>(bytes.size()), &written, nullptr);
-    CloseHandle(h);
-  }
+  std::ofstream(std::filesystem::path(path), std::ios::binary) << bytes;
 }
-
+// The whole file, or "<none>" when it can't be opened; others may hold it open for writing.
+inline std::string ReadAll(const std::wstring& path) {
+  std::ifstream in(std::filesystem::path(path), std::ios::binary);
+  return in ? std::string(std::istreambuf_iterator<char>(in), {}) : "<none>";
+}
+inline std::string Bytes(const std::wstring& text) {
+  return std::string(reinterpret_cast<const char*>(text.data()), text.size() * sizeof(wchar_t));
+}
 // UTF-16LE with byte order mark, the only form translation files take.
-inline std::string Utf16File(const std::wstring& text) {
-  std::string bytes("\xFF\xFE", 2);
-  bytes.append(reinterpret_cast<const char*>(text.data()), text.size() * sizeof(wchar_t));
-  return bytes;
-}
-
+inline std::string Utf16File(const std::wstring& text) { return std::string("\xFF\xFE", 2) + Bytes(text); }
 inline void WriteTranslation(const std::wstring& path, const std::wstring& text) {
   WriteBytes(path, Utf16File(text));
 }
-
+// Makes the application count as not installed, which puts its languages root beside it.
+inline void MarkNotInstalled(const std::wstring& app) {
+  std::filesystem::create_directories(app + L"components");
+  WriteBytes(app + L"components\\NotInstalledApp.txt", "");
+}
 inline std::wstring ExeDirectory() {
   wchar_t path[MAX_PATH] = {};
   GetModuleFileNameW(nullptr, path, MAX_PATH);
-  std::wstring text(path);
-  return text.substr(0, text.find_last_of(L"\\/") + 1);
+  return std::wstring(path, wcsrchr(path, L'\\') + 1);
 }
-
 inline std::wstring TempDirectory() {
   wchar_t path[MAX_PATH] = {};
   GetTempPathW(MAX_PATH, path);

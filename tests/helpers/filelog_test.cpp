@@ -1,20 +1,15 @@
 // The file log and the stack dump.
 #include <gtest/gtest.h>
-
 #include <windows.h>
 #include <oleauto.h>
-
 #include <iostream>
 #include <regex>
-
 #include "helpers/filelog.h"
 #include "helpers/stack_dump.h"
 #include "test_files.h"
 
 using namespace kld::ft;
-
 namespace {
-
 std::wstring LogPath() {
   return testfiles::TempDirectory() + L"marlix_logtest_" + std::to_wstring(GetCurrentProcessId()) + L".log";
 }
@@ -34,12 +29,10 @@ template <class Write> std::string CaptureStdout(Write write) {
   DeleteFileW(path.c_str());
   return text;
 }
-
 struct Filelog : testing::Test {
   void SetUp() override { ASSERT_TRUE(StartFilelog(L"marlix_logtest", true)); }
   void TearDown() override { SetFilelogMode(3), StopFilelog(), DeleteFileW(LogPath().c_str()); }
 };
-
 struct Collector : CStackDumpHandler {
   void OnBegin() override { ++begins; }
   void OnFrame(std::uint64_t, const char* symbol, const char* place) override {
@@ -49,10 +42,9 @@ struct Collector : CStackDumpHandler {
   std::string frames;
   int begins = 0, ends = 0;
 };
-
 }  // namespace
 
-TEST_F(Filelog, EntriesCarryOnePrefixAndIndentFurtherLines) {
+TEST_F(Filelog, EntriesCarryOnePrefixAndIndentFurtherLinesOrGoToStandardOutput) {
   EXPECT_FALSE(StartFilelog(L"marlix_logtest", false)) << "already open";
   EXPECT_EQ(FilelogPath(), NarrowText(LogPath()));
   LogTextA("first %d\r\nsecond\rthird\n\n", 1);
@@ -67,9 +59,7 @@ TEST_F(Filelog, EntriesCarryOnePrefixAndIndentFurtherLines) {
   EXPECT_EQ(match[1].str().substr(14), std::string(6 - thread.size(), ' ') + thread + " ");
   EXPECT_TRUE(Has(text, "wide text\r\n"));
   EXPECT_FALSE(Has(text, "\r\n\r\n")) << "empty lines vanish";
-}
-
-TEST_F(Filelog, ModeFourWritesBareLinesToStandardOutputOnly) {
+  // Mode 4 writes bare lines to standard output only.
   const std::string before = Log();
   SetFilelogMode(4);
   EXPECT_EQ(CaptureStdout([] { LogTextA("alpha\nbeta"); }), "alpha\r\nbeta\r\n");

@@ -1,5 +1,4 @@
 #include <gtest/gtest.h>
-
 #include "helpers/app_helpers.h"
 #include "store/string_table.h"
 #include "test_files.h"

@@ -1,6 +1,5 @@
 // Paths, application identity and error texts.
 #include <gtest/gtest.h>
-
 #include "helpers/app_helpers.h"
 #include "helpers/error_reporter.h"
 #include "helpers/errors_source.h"
@@ -10,9 +9,7 @@
 #include "test_files.h"
 
 using namespace kld::ft;
-
 namespace {
-
 struct FixedReporter : TErrorReporter {
   explicit FixedReporter(HRESULT code) : code(code) {}
   std::wstring GetErrorText(HRESULT c, const wchar_t* text1, const wchar_t*, const wchar_t*) const override {
@@ -25,35 +22,31 @@ struct NamedSource : CErrorsSourceBase {
   std::wstring GetErrorText(HRESULT) const override { return L"named"; }
 };
 HRESULT Code(unsigned long value) { return static_cast<HRESULT>(value); }
-
 }  // namespace
 
-TEST(PathParts, NamePartsUseTheLaterOfBothSeparators) {
+TEST(PathParts, NamePartsSplitsAndComponents) {
   // path, then its directory, name and title parts
   const wchar_t* rows[][4] = {
-      {L"c:\\a/b", L"c:\\a/", L"b", L"b"},  {L"c:/a\\b", L"c:/a\\", L"b", L"b"},  {L"file", L"", L"file", L"file"},
-      {L"c:\\a\\", L"c:\\a\\", L"", L"c:\\a\\"},  {L"a.b.c", L"", L"a.b.c", L"a.b"},  {nullptr, L"", L"", L""},
-      {L"c:\\x.y\\name", L"c:\\x.y\\", L"name", L"name"}};
+      {L"c:\\a/b", L"c:\\a/", L"b", L"b"},         {L"c:/a\\b", L"c:/a\\", L"b", L"b"},
+      {L"c:\\a\\", L"c:\\a\\", L"", L"c:\\a\\"},    {L"c:\\x.y\\name", L"c:\\x.y\\", L"name", L"name"},
+      {L"a.b.c", L"", L"a.b.c", L"a.b"},         {L"file", L"", L"file", L"file"},  {nullptr, L"", L"", L""}};
   for (const auto& r : rows) {
     const std::wstring parts[] = {GetDirectoryPart(r[0]), GetNamePart(r[0]), GetTitlePart(r[0])};
     for (int i = 0; i < 3; ++i) EXPECT_EQ(parts[i], r[i + 1]) << (r[0] ? r[0] : L"null") << " part " << i;
   }
   const wchar_t* separated[][2] = {{L"", L""}, {nullptr, L""}, {L"c:\\a/", L"c:\\a/"}, {L"c:\\a", L"c:\\a\\"}};
   for (const auto& r : separated) EXPECT_EQ(AddTrailingSeparator(r[0]), r[1]) << (r[0] ? r[0] : L"null");
-}
-
-TEST(PathParts, SplitsComposesAndCutsLocalAndNetworkPaths) {
-  // network|server|drive|directory|title|extension|all fields composed again
+  // Split into network|server|drive|directory|title|extension|all fields composed again
   const auto fields = [](const CPathParts& p) {
     return std::to_wstring(p.network) + L"|" + p.server + L"|" + p.drive + L"|" + p.directory + L"|" + p.title +
            L"|" + p.extension + L"|" + p.Compose(31);
   };
-  const wchar_t* rows[][2] = {
+  const wchar_t* splits[][2] = {
       {L"c:\\dir\\sub/name.tar.gz", L"0||c|\\dir\\sub|name.tar|.gz|c:\\dir\\sub\\name.tar.gz"},
       {L"c:\\a.b\\c", L"0||c|\\a.b|c||c:\\a.b\\c"},
       {L"\\\\server\\share\\dir\\f.txt", L"1|server|share|\\dir|f|.txt|\\\\server\\share\\dir\\f.txt"},
       {L"c:\\f.txt", L"0||c||f|.txt|c:\\f.txt"},  {L"plain", L"0||||plain||plain"},  {nullptr, L"0||||||"}};
-  for (const auto& r : rows) EXPECT_EQ(fields(CPathParts(r[0])), r[1]) << (r[0] ? r[0] : L"null");
+  for (const auto& r : splits) EXPECT_EQ(fields(CPathParts(r[0])), r[1]) << (r[0] ? r[0] : L"null");
   EXPECT_EQ(CPathParts(L"c:\\dir\\name.tar.gz").Compose(CPathParts::Title), L"name.tar");
   // Components: runs of delimiters count as one, and ranges past the end are empty.
   CPathComponents parts(L"\\\\srv//a\\\\b/c\\");
@@ -116,7 +109,8 @@ TEST(AppHelpers, NameVersionAndLanguagesRoot) {
   DeleteFileW(plain.c_str());
   EXPECT_EQ(AppNameOfExecutable(L"noseparator"), L"noseparator");
   struct { const wchar_t *app, *version; } rows[] = {
-      {L"gravon tools", L"9"}, {L"GRAVON OFFICE", L"9"}, {L"Gravon GIS Office", L"8.1"}, {L"Gravon GIS", L"4.0.1"}};
+      {L"gravon tools", L"9"}, {L"GRAVON OFFICE", L"9"}, {L"Gravon GIS Office", L"8.1"},
+      {L"Gravon GIS", L"4.0.1"}};
   for (const auto& r : rows) EXPECT_EQ(AppVersionFor(r.app), r.version) << r.app;
   // The languages root follows the not installed marker.
   test_only::ForgetAppPath();

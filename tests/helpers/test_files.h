@@ -7,7 +7,6 @@
 #include <string>
 
 namespace testfiles {
-
 inline void WriteBytes(const std::wstring& path, const std::string& bytes) {
   std::ofstream(std::filesystem::path(path), std::ios::binary) << bytes;
 }
@@ -39,5 +38,4 @@ inline std::wstring TempDirectory() {
   GetTempPathW(MAX_PATH, path);
   return path;
 }
-
 }  // namespace testfiles

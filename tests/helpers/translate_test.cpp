@@ -1,11 +1,9 @@
 // Translation files: their syntax, where they are found, and the texts they give.
 #include <gtest/gtest.h>
-
 #include <atomic>
 #include <random>
 #include <thread>
 #include <vector>
-
 #include "helpers/app_helpers.h"
 #include "helpers/translate_file.h"
 #include "helpers/translate_manager.h"
@@ -13,17 +11,13 @@
 #include "test_files.h"
 
 using namespace kld::ft;
-
 namespace {
-
 constexpr LANGID kEnglish = 1033, kGerman = 1031, kFrench = 1036;
-
 CTranslateFile Parsed(const std::wstring& text) {
   CTranslateFile file;
   file.Parse(text.data(), text.size());
   return file;
 }
-
 HRESULT LoadBytes(const std::string& bytes, CTranslateFile* file) {
   const std::wstring path = testfiles::TempDirectory() + L"marlix_tf_test.txt";
   testfiles::WriteBytes(path, bytes);
@@ -58,13 +52,15 @@ struct TranslationFiles : testing::Test {
     std::filesystem::remove_all(root_);
     for (const wchar_t* language : {L"de-DE", L"fr-FR"}) std::filesystem::create_directories(root_ + language);
   }
-  void TearDown() override { std::filesystem::remove_all(app_ + L"components"), std::filesystem::remove_all(root_); }
+  void TearDown() override {
+    std::filesystem::remove_all(app_ + L"components");
+    std::filesystem::remove_all(root_);
+  }
   void Write(const std::wstring& relative, const std::wstring& text) {
     testfiles::WriteTranslation(root_ + relative, text);
   }
   std::wstring app_, root_;
 };
-
 }  // namespace
 
 TEST(TranslateFile, EscapesPairingAndTails) {
@@ -112,7 +108,8 @@ TEST(TranslateFile, RefusesAnythingButUtf16WithMark) {
 TEST(TranslateFile, HugeFileIsParsedInOnePass) {
   const std::wstring path = testfiles::TempDirectory() + L"marlix_tf_huge.txt";
   // One line of 100 MB with no closing bracket between two pairs.
-  testfiles::WriteTranslation(path, L"[big]\r\n[groß]\r\n[" + std::wstring(50 << 20, L'x') + L"\r\n[end]\r\n[ende]");
+  testfiles::WriteTranslation(path, L"[big]\r\n[groß]\r\n[" + std::wstring(50 << 20, L'x') +
+                                        L"\r\n[end]\r\n[ende]");
   CTranslateFile file;
   EXPECT_EQ(file.Load(path.c_str()), S_OK);
   DeleteFileW(path.c_str());
@@ -122,7 +119,8 @@ TEST(TranslateFile, HugeFileIsParsedInOnePass) {
 }
 
 TEST(TranslateFile, RandomMutationsNeverReadPastTheEnd) {
-  const std::wstring base = L"[Name:]\r\n[Name:]\r\n[Delete]\n[Löschen]\r[a\\nb]\n[c\\\\d]\n[]\n[x]y]\n[z]\r\n[tail";
+  const std::wstring base =
+      L"[Name:]\r\n[Name:]\r\n[Delete]\n[Löschen]\r[a\\nb]\n[c\\\\d]\n[]\n[x]y]\n[z]\r\n[tail";
   const std::wstring alphabet = L"[]\\\r\nnt#$ aZ";
   std::mt19937 random(20261121);
   for (int round = 0; round < 3000; ++round) {
@@ -189,12 +187,12 @@ TEST_F(TranslationFiles, FirstPathFoundForANameServesEveryLanguage) {
 
 TEST_F(TranslationFiles, TranslateTextFallsBackToTheCutEnglishText) {
   Write(L"de-DE\\words.txt", L"[Delete]\n[Löschen]\n[Open#$menu]\n[Öffnen]\n");
-  struct { const wchar_t *text, *name, *result; LANGID from, to; } rows[] = {
-      {L"Delete", L"words", L"Löschen", kEnglish, kGerman}, {L"Open#$menu", L"words", L"Öffnen", kEnglish, kGerman},
-      {L"Open#$other", L"words", L"Open", kEnglish, kGerman}, {L"Missing", L"words", L"Missing", kEnglish, kGerman},
-      {L"Delete", L"words", L"Löschen", kEnglish, kFrench},  // the name's first path serves every language
-      {L"Löschen", L"words", L"Delete", kGerman, kEnglish}, {L"Delete#$x", L"words", L"Delete", kEnglish, kEnglish},
-      {L"", L"words", L"", kEnglish, kGerman},                {L"a#$b", L"nofile", L"a", kEnglish, kGerman}};
+  struct { const wchar_t *text, *result; LANGID from, to; const wchar_t* name = L"words"; } rows[] = {
+      {L"Delete", L"Löschen", kEnglish, kGerman},      {L"Open#$menu", L"Öffnen", kEnglish, kGerman},
+      {L"Open#$other", L"Open", kEnglish, kGerman},    {L"Missing", L"Missing", kEnglish, kGerman},
+      {L"Delete", L"Löschen", kEnglish, kFrench},  // the name's first path serves every language
+      {L"Löschen", L"Delete", kGerman, kEnglish},      {L"Delete#$x", L"Delete", kEnglish, kEnglish},
+      {L"", L"", kEnglish, kGerman},                   {L"a#$b", L"a", kEnglish, kGerman, L"nofile"}};
   for (const auto& r : rows)
     EXPECT_EQ(TranslateText(r.text, r.from, r.to, ModuleInstance(), r.name), r.result) << r.text << r.to;
   EXPECT_NE(TranslateFileManagerIfCreated(), nullptr);

@@ -1,0 +1,368 @@
+#include <gtest/gtest.h>
+#include <cstring>
+#include <string>
+#include <tuple>
+#include <vector>
+#include "helpers/win_handles.h"
+#include "store/pidl_manager.h"
+#include "store/station_record.h"
+#include "store/string_table.h"
+#include "support/registry_sandbox.h"
+#include <sddl.h>  // after <windows.h>
+
+namespace {
+using List = win::UniqueCoMem<ITEMIDLIST>;
+using Ids = std::vector<std::pair<int, std::wstring>>;
+const USHORT kTerminator = 0;
+const LPCITEMIDLIST kEmpty = reinterpret_cast<LPCITEMIDLIST>(&kTerminator);
+const HKEY kUser = HKEY_CURRENT_USER;
+const std::wstring kBase = L"Software\\Gravon\\Shell Extensions\\Marlix DL View", kLevels = kBase + L"\\Levels";
+const BYTE* Raw(LPCITEMIDLIST list) { return reinterpret_cast<const BYTE*>(list); }
+std::wstring LevelPath(int n) { return kLevels + L"\\Station " + std::to_wstring(n); }
+std::wstring NameAt(int n) { return RegReadString(kUser, LevelPath(n), L"Name"); }
+CStationRecord Named(const std::wstring& name) { CStationRecord r; r.Name = name; return r; }
+HRESULT Add(const std::wstring& name) { CStationRecord r = Named(name); return AddStation(r); }
+HRESULT Find(const std::wstring& name) { CStationRecord r = Named(name); return FindStation(r); }
+CStationRecord Full(const std::wstring& name, int seed) {
+  CStationRecord r = Named(name);
+  for (int* n : {&r.Port, &r.BaudRate, &r.StopBits, &r.Parity, &r.DataBits, &r.Flow, &r.CheckSum}) *n = ++seed;
+  r.Manufacturer = L"note " + name;
+  r.Model = L"HRB1X";
+  return r;
+}
+auto Fields(const CStationRecord& r) {
+  return std::tie(r.Name, r.Port, r.BaudRate, r.StopBits, r.Parity, r.DataBits, r.Flow, r.CheckSum, r.Manufacturer,
+                  r.Model);
+}
+void WriteRaw(const std::wstring& path, const wchar_t* value, DWORD type, const void* data, DWORD size) {
+  ASSERT_EQ(RegSetKeyValueW(kUser, path.c_str(), value, type, data, size), ERROR_SUCCESS);
+}
+std::pair<DWORD, DWORD> TypeAndSize(const std::wstring& path, const wchar_t* value) {
+  DWORD type = 0, size = 0;
+  RegGetValueW(kUser, path.c_str(), value, RRF_RT_ANY, &type, nullptr, &size);
+  return {type, size};
+}
+struct Store : ::testing::Test {
+  Ids IdsOf(LPCITEMIDLIST list) {
+    Ids ids;
+    for (UINT i = 0; i < m.GetCount(list); ++i) {
+      List one(m.CopyFrom(list, i));
+      ids.emplace_back(CPidlMgr::GetType(one.Get()), CPidlMgr::GetTextCopy(one.Get()));
+    }
+    return ids;
+  }
+  RegistrySandbox sandbox;
+  CPidlMgr m;
+};
+TEST_F(Store, IdBytesAndListsFromPaths) {
+  using V = std::vector<std::wstring>;
+  for (const auto& [path, parts] : {std::pair<const wchar_t*, V>{nullptr, {}}, {L"\\/\\\\//", {}},
+                                    {L"R//A\\\\B/", {L"R", L"A", L"B"}},
+                                    {L"\\R\\A b\\B\\C", {L"R", L"A b", L"B", L"C"}}})
+    EXPECT_EQ(PathComponents(path), parts) << path;
+  for (auto [at, part] : {std::pair{1, L"A"}, {3, L""}}) EXPECT_EQ(PathComponent(L"/R/A/B", at), part) << at;
+  List file(m.CreateItem(PIDL_FILE, L"file1.tkf", 20));
+  ASSERT_TRUE(file);
+  const BYTE* b = Raw(file.Get());
+  EXPECT_EQ(std::make_tuple(b[0] | (b[1] << 8), b[2] | (b[3] << 8) | (b[4] << 16) | (b[5] << 24), b[39] | b[40]),
+            std::make_tuple(39, 3, 0)) << "size, type, terminator";
+  EXPECT_EQ(std::memcmp(b + 14, L"file1.tkf", 20), 0);
+  EXPECT_EQ(m.GetSize(file.Get()), 41u);
+  EXPECT_EQ(IdSize(List(m.CreateItem(PIDL_LEVEL, L"ab", 0x10006)).Get()), 25) << "the low 16 bits of the size";
+  EXPECT_EQ(IdsOf(List(m.CreateRoot()).Get()), (Ids{{1, L"Marlix Digital Levels"}}));
+  for (const wchar_t* path : {L"", L"\\//"})
+    EXPECT_TRUE(!m.CreateItemFromPath(path) && !m.CreateListFromPath(path)) << path;
+  for (const auto& [path, item, list] : {std::tuple<const wchar_t*, Ids, Ids>{L"R", {{1, L"R"}}, {{1, L"R"}}},
+                                         {L"\\R\\A", {{2, L"A"}}, {{1, L"R"}, {2, L"A"}}},
+                                         {L"R/A/B", {{2, L"A"}}, {{1, L"R"}, {2, L"A"}, {3, L"B"}}},
+                                         {L"R\\A\\B\\C", {{2, L"A"}}, {{1, L"R"}, {2, L"A"}, {3, L"B"}}}}) {
+    EXPECT_EQ(IdsOf(List(m.CreateItemFromPath(path)).Get()), item) << path;
+    EXPECT_EQ(IdsOf(List(m.CreateListFromPath(path)).Get()), list) << path;
+  }
+}
+TEST_F(Store, ListOperationsKindsAndCompare) {
+  List full(m.CreateListFromPath(L"R\\Level\\file1.tkf")), root(m.CreateRoot());
+  EXPECT_EQ(m.GetSize(nullptr) + m.GetCount(nullptr) + m.GetCount(kEmpty), 0u);
+  EXPECT_EQ(std::make_pair(m.GetSize(kEmpty), m.GetCount(full.Get())), std::make_pair(2u, 3u));
+  EXPECT_EQ(CPidlMgr::GetTextCopy(m.GetLast(full.Get())), L"file1.tkf");
+  EXPECT_EQ(Raw(m.GetNext(full.Get())), Raw(full.Get()) + 19 + 4);
+  for (int row = 0; LPCITEMIDLIST none : std::initializer_list<LPCITEMIDLIST>{
+           m.GetLast(kEmpty), m.Concatenate(nullptr, nullptr), m.CopyFrom(full.Get(), 3), m.CopyFrom(kEmpty, 0),
+           m.CopyParent(root.Get())})
+    EXPECT_EQ(none, nullptr) << "row " << row++;
+  for (LPITEMIDLIST made : {m.Concatenate(nullptr, full.Get()), m.Concatenate(full.Get(), nullptr)}) {
+    List copy(made);
+    ASSERT_TRUE(copy && copy.Get() != full.Get()) << "a fresh copy";
+    EXPECT_EQ(std::memcmp(copy.Get(), full.Get(), m.GetSize(full.Get())), 0);
+  }
+  List tail(m.CopyFrom(full.Get(), 1)), parent(m.CopyParent(full.Get()));
+  EXPECT_EQ(IdsOf(tail.Get()), (Ids{{2, L"Level"}, {3, L"file1.tkf"}}));
+  EXPECT_EQ(IdsOf(parent.Get()), (Ids{{1, L"R"}, {2, L"Level"}}));
+  List joined(m.Concatenate(parent.Get(), tail.Get()));
+  EXPECT_EQ(std::make_pair(m.GetSize(joined.Get()), m.GetCount(joined.Get())),
+            std::make_pair(m.GetSize(parent.Get()) + m.GetSize(tail.Get()) - 2, 4u));
+  List level(m.CreateListFromPath(L"R\\L"));
+  using Kind = std::tuple<LPCITEMIDLIST, bool, bool, bool>;  // the kind of a list is that of its last id
+  for (int row = 0; auto [list, top, folder, leaf] :
+       {Kind{root.Get(), true, true, false}, Kind{level.Get(), false, true, false},
+        Kind{full.Get(), false, false, true}, Kind{kEmpty, false, false, false}, Kind{nullptr, false, false, false}})
+    EXPECT_EQ(std::make_tuple(m.IsRoot(list), m.IsTopLevel(list), m.IsFolder(list), m.IsFile(list)),
+              std::make_tuple(top, top, folder, leaf)) << "row " << row++;
+  List a(m.CreateItemFromPath(L"R\\alpha")), upper(m.CreateItemFromPath(L"R\\ALPHA")),
+      b(m.CreateItemFromPath(L"R\\beta")), file(m.CreateItem(PIDL_FILE, L"aaa", 8));
+  for (LPCITEMIDLIST same : {upper.Get(), file.Get()}) EXPECT_EQ(m.Compare(0, a.Get(), same), 0);
+  EXPECT_EQ(m.Compare(0, nullptr, a.Get()), 0);
+  int raw = m.Compare(0, a.Get(), b.Get());
+  EXPECT_LT(raw, 0);
+  EXPECT_EQ(m.Compare(-1, a.Get(), b.Get()), -raw) << "compare ignores case and never orders by type";
+  EXPECT_EQ(m.Compare(3, a.Get(), b.Get()), 3 * raw);
+}
+TEST_F(Store, PathsParsingNameAndValidity) {
+  List one(m.CreateItem(PIDL_LEVEL, L"abc", 8));
+  wchar_t buffer[MAX_PATH];
+  EXPECT_EQ(m.GetPath(one.Get(), buffer, MAX_PATH), 3u);
+  EXPECT_STREQ(buffer, L"abc");
+  EXPECT_EQ(m.GetPath(one.Get(), nullptr, 0), 5u);
+  List full(m.CreateListFromPath(L"/Marlix Digital Levels/L1/file1.tkf"));
+  UINT needed = m.GetPath(full.Get(), nullptr, 0);
+  EXPECT_EQ(needed, 21u + 1 + 2 + 1 + 9 + 1 + 1);
+  std::vector<wchar_t> exact(needed);
+  EXPECT_EQ(m.GetPath(full.Get(), exact.data(), needed), needed - 2);
+  EXPECT_STREQ(exact.data(), L"Marlix Digital Levels\\L1\\file1.tkf");
+  std::vector<wchar_t> small(8, 0x5555);
+  EXPECT_EQ(m.GetPath(full.Get(), small.data(), 6), 5u);
+  EXPECT_STREQ(small.data(), L"Marli") << "a destination too small gets a cut, terminated text";
+  EXPECT_EQ(small[6], wchar_t(0x5555)) << "and nothing past its length";
+  List longPath(m.CreateListFromPath((L"R\\" + std::wstring(259, L'n') + L"\\file1.tkf").c_str()));
+  EXPECT_EQ(m.GetPath(longPath.Get(), buffer, MAX_PATH), UINT(MAX_PATH - 1));
+  EXPECT_EQ(m.GetRootParsingName(nullptr, 0), 41u);
+  EXPECT_EQ(m.GetRootParsingName(buffer, 64), 41u);
+  EXPECT_STREQ(buffer, L"::{D8B818CA-E47C-49a1-96A5-C2AA5FB57F15}");
+  EXPECT_EQ(m.GetRootParsingName(buffer, 3), 3u);
+  List level(m.CreateItemFromPath(L"R\\Mine")), other(m.CreateItemFromPath(L"R\\mine")), root(m.CreateRoot());
+  EXPECT_FALSE(m.IsValid(level.Get())) << "validity asks the store";
+  EXPECT_TRUE(m.IsValid(root.Get()) && m.IsValid(nullptr)) << "the root and no list are always valid";
+  ASSERT_EQ(Add(L"Mine"), S_OK);
+  EXPECT_TRUE(m.IsValid(level.Get()));
+  EXPECT_FALSE(m.IsValid(other.Get()));
+}
+TEST_F(Store, DefaultsAndAStoreThatCannotBeReached) {
+  EXPECT_TRUE(Fields(CStationRecord()) ==
+              std::make_tuple(std::wstring(), 1, 9600, 1, 0, 8, 0, 1, std::wstring(), std::wstring(L"HRA20")));
+  CStationRecord r = Full(L"A", 0);
+  EXPECT_EQ(FindStation(r), E_FAIL);
+  EXPECT_TRUE(RegKeyExists(kUser, kLevels)) << "even a find makes the keys";
+  EXPECT_EQ(UpdateStation(L"A", r), E_INVALIDARG);
+  EXPECT_EQ(DeleteStation(r), E_INVALIDARG);
+  HKEY gone = nullptr;
+  ASSERT_EQ(RegCreateKeyExW(kUser, L"gone", 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &gone, nullptr), ERROR_SUCCESS);
+  ASSERT_EQ(RegDeleteKeyW(kUser, L"gone"), ERROR_SUCCESS);
+  ASSERT_EQ(RegOverridePredefKey(kUser, gone), ERROR_SUCCESS);
+  HRESULT find = FindStation(r), add = AddStation(r);
+  bool saved = SaveDisplaySettings(), loaded = LoadDisplaySettings();
+  RegOverridePredefKey(kUser, nullptr);
+  RegCloseKey(gone);
+  EXPECT_EQ(std::make_tuple(find, add, saved, loaded), std::make_tuple(E_FAIL, E_FAIL, false, false))
+      << "with the user's root on a deleted key nothing below it can be made";
+}
+TEST_F(Store, AddWritesEveryValueAndFindReadsThemBack) {
+  CStationRecord added = Full(L"Level one", 10);
+  ASSERT_EQ(AddStation(added), S_OK);
+  EXPECT_EQ(TypeAndSize(LevelPath(0), L"Name"), std::make_pair(DWORD(REG_SZ), DWORD(20)));
+  EXPECT_EQ(RegReadDword(kUser, LevelPath(0), L"StopBits"), 13u);
+  CStationRecord found = Named(L"Level one");
+  std::wstring key(260, L'x');
+  for (auto [given, text, back] : {std::tuple<DWORD, const wchar_t*, DWORD>{3, L"Staxxxxxxx", 4},
+                                   {0, L"Staxxxxxxx", 0}, {260, L"Station 0", 10}}) {
+    DWORD length = given;
+    ASSERT_EQ(FindStation(found, key.data(), &length), S_OK);
+    EXPECT_EQ(std::make_pair(std::wstring(key.c_str()).substr(0, 10), length), std::make_pair(std::wstring(text), back))
+        << given << ": a short buffer gets the key name cut as wcsncpy does; a zero length leaves it alone";
+  }
+  EXPECT_TRUE(Fields(found) == Fields(added));
+  CStationRecord again = Named(L"Level one");
+  EXPECT_EQ(AddStation(again), E_INVALIDARG);
+  EXPECT_TRUE(Fields(again) == Fields(added)) << "adding a taken name fails and hands back the stored level";
+  EXPECT_FALSE(RegKeyExists(kUser, LevelPath(1)));
+}
+TEST_F(Store, NumbersFillGapsNamesCountCaseAndDeleteTakesTheTree) {
+  for (int n : {0, 2}) RegWriteString(kUser, LevelPath(n), L"Name", L"taken");
+  for (const wchar_t* name : {L"abc", L"ABC"}) ASSERT_EQ(Add(name), S_OK) << name;
+  EXPECT_EQ(NameAt(1) + L"|" + NameAt(3), L"abc|ABC") << "numbers fill gaps";
+  EXPECT_EQ(MakeUniqueStationName(L"Abc"), L"Abc");
+  EXPECT_EQ(MakeUniqueStationName(L"abc"), L"abc (2)");
+  ASSERT_EQ(Add(L"abc (2)"), S_OK);
+  EXPECT_EQ(MakeUniqueStationName(L"abc"), L"abc (3)");
+  for (const wchar_t* sub : {L"\\x\\y\\z", L"\\w"}) RegWriteDword(kUser, LevelPath(1) + sub, L"v", 1);
+  EXPECT_EQ(DeleteStation(Named(L"Abc")), E_INVALIDARG);
+  ASSERT_EQ(DeleteStation(Named(L"abc")), S_OK);
+  EXPECT_FALSE(RegKeyExists(kUser, LevelPath(1)));
+  EXPECT_EQ(DeleteStation(Named(L"abc")), E_INVALIDARG);
+  ASSERT_EQ(Add(L"next"), S_OK);
+  EXPECT_EQ(NameAt(1), L"next") << "a freed number comes back";
+  win::UniqueHKey levels;
+  ASSERT_EQ(RegOpenKeyExW(kUser, kLevels.c_str(), 0, KEY_ALL_ACCESS, levels.Put()), ERROR_SUCCESS);
+  EXPECT_EQ(DeleteKeyTree(levels.Get(), L""), LONG(ERROR_BADKEY));
+  EXPECT_EQ(DeleteKeyTree(levels.Get(), L"absent"), LONG(ERROR_FILE_NOT_FOUND));
+  CStationRecord a = Full(L"A", 0), b = Full(L"B", 20), renamed = Full(L"C", 40), clash = Full(L"A", 60);
+  for (CStationRecord* r : {&a, &b}) ASSERT_EQ(AddStation(*r), S_OK);
+  EXPECT_EQ(UpdateStation(L"B", renamed), S_OK) << "renames in place";
+  EXPECT_EQ(NameAt(6), L"C");
+  EXPECT_EQ(RegReadDword(kUser, LevelPath(6), L"Port"), 41u);
+  EXPECT_EQ(UpdateStation(L"B", renamed), E_INVALIDARG);
+  EXPECT_EQ(UpdateStation(L"C", clash), S_OK) << "onto a held name: both keys now say A, a find yields the first";
+  EXPECT_EQ(NameAt(6), L"A");
+  CStationRecord found = Named(L"A");
+  ASSERT_EQ(FindStation(found), S_OK);
+  EXPECT_TRUE(Fields(found) == Fields(a));
+}
+TEST_F(Store, ReadKeepsItsOrderAndIgnoresTypes) {
+  const std::wstring key = LevelPath(0);
+  RegWriteString(kUser, key, L"Name", L"gap");
+  for (auto [value, n] : {std::pair{L"Port", 5}, {L"StopBits", 2}, {L"Parity", 1}}) RegWriteDword(kUser, key, value, n);
+  CStationRecord r = Full(L"gap", 100);
+  ASSERT_EQ(FindStation(r), S_OK) << "a gap still counts as found";
+  EXPECT_EQ(std::tie(r.Port, r.StopBits, r.BaudRate, r.Parity), std::make_tuple(5, 2, 102, 104))
+      << "Parity lies behind the missing BaudRate: not reached";
+  win::UniqueHKey level;
+  ASSERT_EQ(RegOpenKeyExW(kUser, key.c_str(), 0, KEY_READ, level.Put()), ERROR_SUCCESS);
+  EXPECT_EQ(ReadStation(r, level.Get()), LONG(ERROR_FILE_NOT_FOUND));
+  const BYTE small[2] = {7, 0}, wide[8] = {1, 2, 3, 4, 5, 6, 7, 8};
+  RegWriteDword(kUser, key, L"BaudRate", 1);
+  WriteRaw(key, L"DataBits", REG_BINARY, small, sizeof(small));
+  WriteRaw(key, L"Manufacturer", REG_DWORD, L"hi", 4);
+  WriteRaw(key, L"Model", REG_SZ, L"HRA40", 12);
+  WriteRaw(key, L"Flow", REG_BINARY, wide, sizeof(wide));
+  CStationRecord typed = Full(L"gap", 200);
+  EXPECT_EQ(ReadStation(typed, level.Get()), LONG(ERROR_MORE_DATA));
+  EXPECT_EQ(std::tie(typed.DataBits, typed.Manufacturer, typed.Model, typed.Flow),
+            std::make_tuple(7, std::wstring(L"hi"), std::wstring(L"HRA40"), 206))
+      << "a short binary number reads; a number wider than 4 bytes stops the read";
+}
+TEST_F(Store, NamesAtAndPastTheReadLimitAndLockedLevels) {
+  ASSERT_EQ(Add(std::wstring(259, L'a')), S_OK);
+  EXPECT_EQ(Find(std::wstring(259, L'a')), S_OK);
+  ASSERT_EQ(Add(std::wstring(260, L'b')), S_OK);
+  EXPECT_EQ(Find(std::wstring(260, L'b')), E_FAIL) << "260 characters need 522 bytes: never matched";
+  ASSERT_EQ(Add(std::wstring(260, L'b')), S_OK);
+  EXPECT_TRUE(RegKeyExists(kUser, LevelPath(2)));
+  RegWriteString(kUser, LevelPath(5), L"Name", L"locked");
+  win::UniqueHKey locked;
+  ASSERT_EQ(RegOpenKeyExW(kUser, LevelPath(5).c_str(), 0, KEY_ALL_ACCESS, locked.Put()), ERROR_SUCCESS);
+  PSECURITY_DESCRIPTOR sd = nullptr;  // everyone: no setting of values, all else allowed
+  ASSERT_TRUE(ConvertStringSecurityDescriptorToSecurityDescriptorW(L"D:(D;;0x2;;;WD)(A;;0xF003D;;;WD)",
+                                                                   SDDL_REVISION_1, &sd, nullptr));
+  EXPECT_EQ(RegSetKeySecurity(locked.Get(), DACL_SECURITY_INFORMATION, sd), ERROR_SUCCESS);
+  LocalFree(sd);
+  EXPECT_EQ(Find(L"locked"), E_FAIL) << "a level key that refuses full access is passed over";
+  std::wstring full(260, L'd');
+  WriteRaw(LevelPath(10), L"Name", REG_BINARY, full.data(), 520);
+  EXPECT_EQ(Find(full), S_OK) << "520 bytes with no terminator, and an odd size, still end inside the buffer";
+  WriteRaw(LevelPath(11), L"Name", REG_BINARY, L"odd!", 5);
+  EXPECT_EQ(Find(L"od"), E_FAIL);
+  EXPECT_EQ(Find(L"odd"), S_OK);
+}
+TEST_F(Store, DisplaySettings) {
+  auto load = [] { bool ok = LoadDisplaySettings(); return std::make_tuple(ok, ColumnWidths[0], ColumnWidths[1]); };
+  ColumnWidths[0] = ColumnWidths[1] = 7;
+  EXPECT_EQ(load(), std::make_tuple(false, 100, 100));
+  EXPECT_FALSE(RegKeyExists(kUser, kBase));
+  ColumnWidths[0] = 150;
+  ASSERT_TRUE(SaveDisplaySettings());
+  EXPECT_EQ(TypeAndSize(kBase, L"Display Settings"), std::make_pair(DWORD(REG_BINARY), DWORD(12)));
+  ColumnWidths[0] = ColumnWidths[1] = 0;
+  EXPECT_EQ(load(), std::make_tuple(true, 150, 100));
+  const int numbers[5] = {33, 44, 55, 66, 77};
+  WriteRaw(kBase, L"Display Settings", REG_BINARY, numbers, 17);
+  EXPECT_EQ(load(), std::make_tuple(false, 100, 100)) << "17 bytes";
+  WriteRaw(kBase, L"Display Settings", REG_BINARY, numbers, 16);
+  EXPECT_EQ(load(), std::make_tuple(true, 33, 44)) << "16 bytes: the first two count";
+  ColumnWidths[0] = ColumnWidths[1] = 100;
+}
+std::vector<BYTE> Bytes(HGLOBAL h) {
+  win::GlobalLockGuard<const BYTE> lock(h);
+  return {lock.Get(), lock.Get() + lock.Size()};
+}
+std::vector<CStationRecord> Unpacked(const std::vector<BYTE>& bytes) {
+  win::UniqueHGlobal h(GlobalAlloc(GMEM_MOVEABLE, bytes.size()));
+  std::memcpy(win::GlobalLockGuard<BYTE>(h.Get()).Get(), bytes.data(), bytes.size());
+  std::vector<CStationRecord> out;
+  EXPECT_EQ(UnpackStations(h.Get(), out), S_OK);
+  return out;
+}
+TEST(PackedStations, RoundTripKeepsEveryFieldAndTheLayout) {
+  const std::vector<CStationRecord> records = {Full(L"first", 1), Full(L"", 50), Full(L"third level", -9)};
+  win::UniqueHGlobal h(PackStations(records));
+  ASSERT_TRUE(h);
+  EXPECT_EQ(GlobalFlags(h.Get()) & GMEM_DDESHARE, UINT(GMEM_DDESHARE));
+  std::vector<BYTE> bytes = Bytes(h.Get());
+  EXPECT_GE(bytes.size(), 4u + 3 * (4 + 28) + (6 + 11 + 6 + 1 + 6 + 6 + 12 + 17 + 6) * 2);
+  EXPECT_EQ(bytes[0], 3);
+  EXPECT_EQ(bytes[4], (6 + 11 + 6) * 2 + 28);  // size of the first packed record
+  EXPECT_EQ(bytes[8 + 12], 2);                  // its Port, right behind the name's terminator
+  std::vector<CStationRecord> out = {Named(L"kept")};
+  ASSERT_EQ(UnpackStations(h.Get(), out), S_OK);
+  ASSERT_EQ(out.size(), 4u);
+  EXPECT_EQ(out[0].Name, L"kept");
+  for (size_t i = 0; i < records.size(); ++i) EXPECT_TRUE(Fields(out[i + 1]) == Fields(records[i])) << i;
+  win::UniqueHGlobal empty(PackStations({}));
+  EXPECT_TRUE(Unpacked(Bytes(empty.Get())).empty());
+  EXPECT_EQ(UnpackStations(nullptr, out), S_OK);
+  EXPECT_EQ(out.size(), 4u);
+}
+TEST(PackedStations, DamagedBlocksYieldOnlyTheWholeRecordsBefore) {
+  const std::vector<CStationRecord> records = {Full(L"one", 1), Full(L"two", 2)};
+  win::UniqueHGlobal h(PackStations(records));
+  std::vector<BYTE> bytes = Bytes(h.Get());
+  const size_t firstEnd = 4 + 4 + bytes[4];
+  bytes.resize(firstEnd + 4 + bytes[firstEnd]);
+  for (size_t cut : {firstEnd, firstEnd + 2, firstEnd + 9, bytes.size() - 1}) {
+    auto out = Unpacked(std::vector<BYTE>(bytes.begin(), bytes.begin() + cut));
+    ASSERT_EQ(out.size(), 1u) << cut;
+    EXPECT_TRUE(Fields(out[0]) == Fields(records[0]));
+  }
+  EXPECT_TRUE(Unpacked({1, 0}).empty());
+  auto patched = [&](size_t at, BYTE value) { auto copy = bytes; copy[at] = value; return Unpacked(copy).size(); };
+  EXPECT_EQ(patched(3, 0x7F), 2u) << "a count beyond the records";
+  EXPECT_EQ(patched(firstEnd + 1, 0x40), 1u) << "a size past the end";
+  EXPECT_EQ(patched(7, 0xFF), 0u);
+  EXPECT_GE(patched(4, 0), 1u) << "a short size is trusted";
+  std::vector<BYTE> open(bytes.begin(), bytes.end() - 10);  // a last string without its terminator
+  open.insert(open.end(), {'x', 0, 1, 1, 1, 1, 1, 1, 1, 1});
+  EXPECT_EQ(Unpacked(open).size(), 1u);
+}
+size_t Count(const std::wstring& text, const std::wstring& part) {
+  size_t n = 0;
+  for (size_t at = text.find(part); at != std::wstring::npos; at = text.find(part, at + 1)) ++n;
+  return n;
+}
+TEST(StringTable, ExactTextsAllEightyEntriesAndNothingElse) {
+  for (auto [id, text] : {std::pair<UINT, const wchar_t*>{270, L"%d bytes"}, {1001, L"Marlix Digital Levels"},
+                          {1014, L"Performing file transfer - %d%% done"},
+                          {1024, L"Digital Level's name can not contain folowing symbols:\n\t\t\\*/"},
+                          {1047, L"HRA20"}, {1049, L"HRB1X"},
+                          {2010, L"Can not open COM port. Port is already open by another program"}})
+    EXPECT_EQ(LoadTranslatedString(id), text) << id;
+  using Lines = std::tuple<UINT, size_t, const wchar_t*>;
+  for (auto [id, breaks, last] : {Lines{1050, 6, L"7. Press 'Enter' on HRA20 and this will start the download"},
+                                  Lines{1051, 6, L"7. Press 'Enter' on HRA40 and this will start the download"},
+                                  Lines{1052, 9, L"10. Press 'Enter' on HRB1X and this will start the download"}}) {
+    std::wstring text = LoadTranslatedString(id);
+    EXPECT_EQ(Count(text, L"\r\n"), breaks) << id << ": CR LF between lines, no line end after the last";
+    EXPECT_EQ(Count(text, L"\n"), breaks) << id;
+    EXPECT_EQ(text.substr(text.rfind(L"\r\n") + 2), last) << id;
+  }
+  const UINT ids[] = {270,  271,  272,  273,  350,  351,  352,  353,  354,  355,  356,  357,  358,  359,  360,  361,
+                      362,  363,  364,  1000, 1001, 1002, 1003, 1004, 1005, 1006, 1007, 1008, 1009, 1010, 1011, 1012,
+                      1013, 1014, 1015, 1016, 1017, 1018, 1022, 1023, 1024, 1025, 1026, 1027, 1028, 1029, 1030, 1031,
+                      1032, 1033, 1034, 1036, 1037, 1038, 1039, 1040, 1041, 1042, 1043, 1044, 1045, 1046, 1047, 1048,
+                      1049, 1050, 1051, 1052, 1053, 1103, 1104, 1105, 1106, 1109, 1110, 1111, 1112, 1113, 1114, 2010};
+  static_assert(sizeof(ids) / sizeof(ids[0]) == 80);
+  for (UINT id : ids) EXPECT_FALSE(LoadTranslatedString(id).empty()) << id;
+  for (UINT id : {0u, 1019u, 1035u, 1054u, 1107u, 1108u, 1115u, 2011u, 4001u, 4041u, 4064u, 65535u})
+    EXPECT_EQ(LoadTranslatedString(id), L"") << id << ": a gap in a loaded block, or a missing block";
+  EXPECT_EQ(CutAtTailMarker(L"abc#$1"), L"abc");
+  EXPECT_EQ(CutAtTailMarker(L"a#b$c#$x#$y"), L"a#b$c");
+  EXPECT_EQ(CutAtTailMarker(L"plain"), L"plain");
+}
+}  // namespace

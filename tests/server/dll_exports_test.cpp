@@ -1,68 +1,73 @@
 #include <gtest/gtest.h>
-
 #include <shlobj.h>
-
-#include "loaded_dll.h"
+#include <string>
+#include <tuple>
 #include "server/class_ids.h"
 #include "server/com_base.h"
 #include "support/registry_sandbox.h"
 
 namespace {
-
-const CLSID* const kServedClasses[] = {
-    &CLSID_MarlixDLShellFolder, &CLSID_MarlixDLShellView,  &CLSID_MarlixDLEnumIDList,
-    &CLSID_MarlixDLExtractIcon, &CLSID_MarlixDLDataObject, &CLSID_MarlixDLQueryInfo,
-    &CLSID_MarlixDLDropTarget,  &CLSID_MarlixDLDropTargetOnListView,
+// The built MarlixDLShellExt.dll loaded into the test process, with its exports.
+struct LoadedDll {
+  LoadedDll() {  // MARLIX_DLL_PATH is the build's Unix path; Wine maps it through drive Z:.
+    for (char c : std::string(MARLIX_DLL_PATH)) path += c == '/' ? L'\\' : wchar_t(c);
+    if (!(module = LoadLibraryW(path.c_str()))) return;
+    Bind("DllCanUnloadNow", &canUnloadNow);
+    Bind("DllGetClassObject", &getClassObject);
+    Bind("DllRegisterServer", &registerServer);
+    Bind("DllUnregisterServer", &unregisterServer);
+  }
+  ~LoadedDll() { if (module) FreeLibrary(module); }
+  template <class F>
+  void Bind(const char* name, F* f) { *f = reinterpret_cast<F>(reinterpret_cast<void*>(GetProcAddress(module, name))); }
+  std::wstring path = L"Z:";
+  HMODULE module = nullptr;
+  HRESULT(STDAPICALLTYPE* canUnloadNow)() = nullptr;
+  HRESULT(STDAPICALLTYPE* getClassObject)(REFCLSID, REFIID, void**) = nullptr;
+  HRESULT(STDAPICALLTYPE* registerServer)() = nullptr;
+  HRESULT(STDAPICALLTYPE* unregisterServer)() = nullptr;
 };
 
-class DllExports : public testing::Test {
- protected:
-  // The module reads and writes the user's settings at load and unload.
-  RegistrySandbox sandbox_;
-  LoadedDll dll_;
-
+struct DllExports : testing::Test {
   void SetUp() override {
     ASSERT_TRUE(dll_.module) << "cannot load " << testing::PrintToString(dll_.path);
     ASSERT_TRUE(dll_.canUnloadNow && dll_.getClassObject && dll_.registerServer && dll_.unregisterServer);
   }
+  RegistrySandbox sandbox_;  // the module reads and writes the user's settings at load and unload
+  LoadedDll dll_;
 };
 
 TEST_F(DllExports, ClassObjectsForTheMapOnly) {
   EXPECT_EQ(dll_.canUnloadNow(), S_OK);
-
   void* raw = reinterpret_cast<void*>(1);
   EXPECT_EQ(dll_.getClassObject(CLSID_MarlixDLContextMenu, IID_IClassFactory, &raw), CLASS_E_CLASSNOTAVAILABLE);
   EXPECT_EQ(raw, nullptr);
   EXPECT_EQ(dll_.getClassObject(IID_IUnknown, IID_IClassFactory, &raw), CLASS_E_CLASSNOTAVAILABLE);
   EXPECT_EQ(dll_.getClassObject(CLSID_MarlixDLShellFolder, IID_IClassFactory, nullptr), E_POINTER);
-
-  for (const CLSID* clsid : kServedClasses) {
+  for (const CLSID* clsid : {&CLSID_MarlixDLShellFolder, &CLSID_MarlixDLShellView, &CLSID_MarlixDLEnumIDList,
+                             &CLSID_MarlixDLExtractIcon, &CLSID_MarlixDLDataObject, &CLSID_MarlixDLQueryInfo,
+                             &CLSID_MarlixDLDropTarget, &CLSID_MarlixDLDropTargetOnListView}) {
     com::ComPtr<IClassFactory> factory;
     ASSERT_EQ(dll_.getClassObject(*clsid, IID_IClassFactory, factory.PutVoid()), S_OK);
     EXPECT_EQ(dll_.canUnloadNow(), S_FALSE) << "a class object holds the module";
-
-    com::ComPtr<IUnknown> outer(factory.Get()), made;
-    EXPECT_EQ(factory->CreateInstance(outer.Get(), IID_IUnknown, made.PutVoid()), CLASS_E_NOAGGREGATION);
+    com::ComPtr<IUnknown> made;
+    EXPECT_EQ(factory->CreateInstance(factory.Get(), IID_IUnknown, made.PutVoid()), CLASS_E_NOAGGREGATION);
     EXPECT_FALSE(made);
     EXPECT_EQ(factory->CreateInstance(nullptr, IID_IUnknown, nullptr), E_POINTER);
-    outer.Reset();
-
-    // A class whose object can be made standalone keeps the module while it lives.
     if (SUCCEEDED(factory->CreateInstance(nullptr, IID_IUnknown, made.PutVoid()))) {
       factory.Reset();
-      EXPECT_EQ(dll_.canUnloadNow(), S_FALSE);
+      EXPECT_EQ(dll_.canUnloadNow(), S_FALSE) << "an object made standalone keeps the module while it lives";
       made.Reset();
     }
     factory.Reset();
     EXPECT_EQ(dll_.canUnloadNow(), S_OK);
   }
-
   com::ComPtr<IUnknown> unknown;
   EXPECT_EQ(dll_.getClassObject(CLSID_MarlixDLDataObject, IID_IDropTarget, unknown.PutVoid()), E_NOINTERFACE);
   EXPECT_EQ(dll_.canUnloadNow(), S_OK);
 }
 
-TEST_F(DllExports, LockServerHoldsTheModule) {
+TEST_F(DllExports, LockServerHoldsTheModuleAndImageListsAreBuiltAtLoad) {
   com::ComPtr<IClassFactory> factory;
   ASSERT_EQ(dll_.getClassObject(CLSID_MarlixDLQueryInfo, IID_IClassFactory, factory.PutVoid()), S_OK);
   EXPECT_EQ(factory->LockServer(TRUE), S_OK);
@@ -72,11 +77,16 @@ TEST_F(DllExports, LockServerHoldsTheModule) {
   EXPECT_EQ(factory->LockServer(FALSE), S_OK);
   factory.Reset();
   EXPECT_EQ(dll_.canUnloadNow(), S_OK);
+  ASSERT_EQ(dll_.getClassObject(CLSID_MarlixDLExtractIcon, IID_IClassFactory, factory.PutVoid()), S_OK);
+  com::ComPtr<IExtractIconW> icon;
+  ASSERT_EQ(factory->CreateInstance(nullptr, IID_IExtractIconW, icon.PutVoid()), S_OK);
+  for (UINT index : {0u, 1u, 2u}) {
+    HICON large = nullptr, small = nullptr;
+    EXPECT_EQ(icon->Extract(L"", index, &large, &small, 0), S_OK);
+    EXPECT_TRUE(large && small) << index;
+    for (HICON h : {large, small}) if (h) DestroyIcon(h);
+  }
 }
-
-}  // namespace
-
-namespace {
 
 TEST(DllLifetime, ColumnWidthsAreReadAtLoadAndWrittenBackAtUnload) {
   RegistrySandbox sandbox;
@@ -92,23 +102,6 @@ TEST(DllLifetime, ColumnWidthsAreReadAtLoadAndWrittenBackAtUnload) {
   DWORD size = sizeof(saved);
   ASSERT_EQ(RegGetValueW(HKEY_CURRENT_USER, base.c_str(), L"Display Settings", RRF_RT_REG_BINARY, nullptr, saved,
                          &size), ERROR_SUCCESS);
-  EXPECT_EQ(size, 12u);
-  EXPECT_EQ(saved[0], 140);
-  EXPECT_EQ(saved[1], 260);
+  EXPECT_EQ(std::make_tuple(size, saved[0], saved[1]), std::make_tuple(DWORD(12), 140, 260));
 }
-
-TEST_F(DllExports, ImageListsAreBuiltAtLoad) {
-  com::ComPtr<IClassFactory> factory;
-  ASSERT_EQ(dll_.getClassObject(CLSID_MarlixDLExtractIcon, IID_IClassFactory, factory.PutVoid()), S_OK);
-  com::ComPtr<IExtractIconW> icon;
-  ASSERT_EQ(factory->CreateInstance(nullptr, IID_IExtractIconW, icon.PutVoid()), S_OK);
-  for (UINT index : {0u, 1u, 2u}) {
-    HICON large = nullptr, small = nullptr;
-    EXPECT_EQ(icon->Extract(L"", index, &large, &small, 0), S_OK);
-    EXPECT_TRUE(large && small) << index;
-    if (large) DestroyIcon(large);
-    if (small) DestroyIcon(small);
-  }
-}
-
 }  // namespace

@@ -8,8 +8,6 @@ set(MARLIX_DATA_TEST_SUPPORT ${CMAKE_CURRENT_SOURCE_DIR}/data_test_support.cpp
     ${CMAKE_SOURCE_DIR}/tools/marlix_comm/survey_job.cpp)
 
 marlix_test(data_tests SOURCES
-  ${CMAKE_CURRENT_SOURCE_DIR}/stream2_test.cpp
-  ${CMAKE_CURRENT_SOURCE_DIR}/enum_format_etc_test.cpp
   ${CMAKE_CURRENT_SOURCE_DIR}/data_object_test.cpp
   ${MARLIX_DATA_TEST_SUPPORT})
 set_target_properties(data_tests PROPERTIES RUNTIME_OUTPUT_DIRECTORY ${MARLIX_DATA_TEST_DIR})

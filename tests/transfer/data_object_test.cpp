@@ -1,267 +1,261 @@
 #include <gtest/gtest.h>
 
+#include <cstddef>
 #include <cstring>
-#include <string>
-#include <vector>
+#include <fstream>
 
 #include "data_test_support.h"
 #include "helpers/win_handles.h"
-#include "server/com_base.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
 #include "transfer/data_object.h"
 #include "transfer/download_dialog.h"
+#include "transfer/enum_format_etc.h"
+#include "transfer/stream2.h"
 
 namespace {
 
-FORMATETC Request(const wchar_t* name, DWORD tymed, LONG index = -1) {
-  return {CLIPFORMAT(RegisterClipboardFormatW(name)), nullptr, DVASPECT_CONTENT, index, tymed};
-}
-
-com::ComPtr<CMarlixDLDataObject> ObjectFor(std::initializer_list<std::pair<const wchar_t*, bool>> items) {
-  auto obj = com::Make<CMarlixDLDataObject>();
-  for (auto& [level, withFile] : items) {
-    win::UniqueCoMem<ITEMIDLIST> list(MakeFullList(level, withFile));
-    obj->AddItem(list.Get());
-  }
-  return obj;
-}
-
 class DataObject : public testing::Test {
  protected:
-  void AddLevels(std::initializer_list<const wchar_t*> names) {
-    for (const wchar_t* name : names) {
-      CStationRecord r;
-      r.Name = name;
-      ASSERT_EQ(AddStation(r), S_OK);
-    }
+  // Stores the levels, then makes an object of the items (level, with the virtual file).
+  com::ComPtr<CMarlixDLDataObject> Make(std::initializer_list<const wchar_t*> levels,
+                                        std::initializer_list<std::pair<const wchar_t*, bool>> items) {
+    for (CStationRecord r; auto name : levels) { r.Name = name; EXPECT_EQ(AddStation(r), S_OK); }
+    auto obj = com::Make<CMarlixDLDataObject>();
+    for (auto& [level, file] : items) obj->AddItem(win::UniqueCoMem<ITEMIDLIST>(MakeFullList(level, file)).Get());
+    return obj;
+  }
+  // The bytes of a block answered with S_OK as a medium that passes to the caller.
+  static std::vector<BYTE> Fetch(IDataObject* obj, const wchar_t* format) {
+    FORMATETC f = Request(format, TYMED_HGLOBAL);
+    STGMEDIUM m{};
+    EXPECT_EQ(obj->GetData(&f, &m), S_OK) << format;
+    if (m.tymed != TYMED_HGLOBAL) return {};
+    EXPECT_EQ(m.pUnkForRelease, nullptr);
+    EXPECT_EQ(GlobalFlags(m.hGlobal) & GMEM_DDESHARE, UINT(GMEM_DDESHARE)) << format;
+    std::vector<BYTE> bytes(GlobalSize(m.hGlobal));
+    std::memcpy(bytes.data(), win::GlobalLockGuard<BYTE>(m.hGlobal).Get(), bytes.size());
+    ReleaseStgMedium(&m);
+    return bytes;
   }
   void TearDown() override { EXPECT_EQ(com::ModuleLockCount(), locks_); }
   RegistrySandbox sandbox_;
-  PrivateTempDir temp_;
   long locks_ = com::ModuleLockCount();
   STGMEDIUM m_{};
 };
 
-TEST_F(DataObject, DropEffectDescriptorAndIdListArrayBytes) {
-  auto obj = ObjectFor({{L"Lev", true}, {L"Other", true}});
-  FORMATETC f = Request(L"Preferred DropEffect", TYMED_HGLOBAL);
-  ASSERT_EQ(obj->GetData(&f, &m_), S_OK);
-  EXPECT_EQ(m_.pUnkForRelease, nullptr);
-  EXPECT_EQ(GlobalFlags(m_.hGlobal) & GMEM_DDESHARE, UINT(GMEM_DDESHARE));
-  EXPECT_EQ(win::GlobalLockGuard<DWORD>(m_.hGlobal).Size(), 4u);
-  EXPECT_EQ(*win::GlobalLockGuard<DWORD>(m_.hGlobal).Get(), DWORD(DROPEFFECT_COPY));
+// Everything but a valid contents request is answered at once, and no dialog comes up.
+TEST_F(DataObject, RequestsThatNeedNoTransfer) {
+  auto obj = com::Make<CMarlixDLDataObject>();
+  DialogDriver watch(IDCANCEL);
+  // Kept by nobody: the medium stays the caller's, and the format is unknown all the same.
+  FORMATETC other = Request(L"Other Format", TYMED_HGLOBAL);
+  m_.tymed = TYMED_HGLOBAL;
+  m_.hGlobal = GlobalAlloc(GMEM_MOVEABLE, 8);
+  EXPECT_EQ(obj->SetData(&other, &m_, TRUE), S_OK);
+  EXPECT_EQ(GlobalSize(m_.hGlobal), 8u);
   ReleaseStgMedium(&m_);
-
-  f = Request(L"FileGroupDescriptorW", TYMED_HGLOBAL);
-  ASSERT_EQ(obj->GetData(&f, &m_), S_OK);
-  {
-    win::GlobalLockGuard<FILEGROUPDESCRIPTORW> group(m_.hGlobal);
-    ASSERT_EQ(group.Size(), 4u + 592u * 2);
-    EXPECT_EQ(group.Get()->cItems, 2u);
-    EXPECT_STREQ(group.Get()->fgd[1].cFileName, L"file1.tkf");
-    EXPECT_EQ(group.Get()->fgd[1].dwFlags, 0u);
+  // The first four are the list, in its order.
+  const struct { const wchar_t* format; DWORD tymed; HRESULT query, get; std::vector<BYTE> block; } rows[] = {
+      {L"FileContents", TYMED_ISTREAM, S_OK, S_FALSE, {}},
+      {L"FileGroupDescriptorW", TYMED_HGLOBAL, S_OK, S_FALSE, {}},
+      {L"Shell IDList Array", TYMED_HGLOBAL, S_OK, S_FALSE, {}},
+      {L"Marlix Total Stations", TYMED_HGLOBAL, S_OK, S_OK, {0, 0, 0, 0}},
+      {L"Preferred DropEffect", TYMED_HGLOBAL, S_OK, S_OK, {DROPEFFECT_COPY, 0, 0, 0}},
+      {L"FileContents", TYMED_ISTREAM | TYMED_HGLOBAL, S_OK, S_FALSE, {}},  // the stream bit is enough
+      {L"FileContents", TYMED_HGLOBAL, S_FALSE, E_INVALIDARG, {}},
+      {L"FileGroupDescriptorW", TYMED_HGLOBAL | TYMED_ISTREAM, S_FALSE, E_INVALIDARG, {}},  // the others: exactly
+      {L"Shell IDList Array", TYMED_ISTREAM, S_FALSE, E_INVALIDARG, {}},
+      {L"Marlix Total Stations", TYMED_HGLOBAL | TYMED_FILE, S_FALSE, E_INVALIDARG, {}},
+      {L"Preferred DropEffect", TYMED_HGLOBAL | TYMED_ISTREAM, S_FALSE, E_INVALIDARG, {}},
+      {L"Other Format", TYMED_HGLOBAL, S_FALSE, E_INVALIDARG, {}}};
+  for (auto& row : rows) {
+    SCOPED_TRACE(testing::Message() << "format " << row.format << ", tymed " << row.tymed);
+    FORMATETC f = Request(row.format, row.tymed, 0);
+    EXPECT_EQ(obj->QueryGetData(&f), row.query);
+    if (row.get == S_OK) {
+      EXPECT_EQ(Fetch(obj.Get(), row.format), row.block);
+      continue;
+    }
+    m_.tymed = 0x55;
+    EXPECT_EQ(obj->GetData(&f, &m_), row.get);
+    EXPECT_EQ(m_.tymed, 0x55u) << "the medium stays untouched";
   }
-  ReleaseStgMedium(&m_);
 
-  f = Request(L"Shell IDList Array", TYMED_HGLOBAL);
-  ASSERT_EQ(obj->GetData(&f, &m_), S_OK);
-  win::UniqueCoMem<ITEMIDLIST> full(MakeFullList(L"Lev", true));
-  const BYTE* ids = reinterpret_cast<const BYTE*>(full.Get());
-  const USHORT rootCb = *reinterpret_cast<const USHORT*>(ids);
-  const UINT parentIds = rootCb + *reinterpret_cast<const USHORT*>(ids + rootCb);
-  const UINT parentSize = parentIds + 2, fileSize = 41;
-  {
-    win::GlobalLockGuard<BYTE> block(m_.hGlobal);
-    const BYTE* b = block.Get();
-    const auto* cida = reinterpret_cast<const CIDA*>(b);
-    ASSERT_EQ(block.Size(), 16 + parentSize + 2 * fileSize);
-    EXPECT_EQ(cida->cidl, 2u);
-    EXPECT_EQ(cida->aoffset[0], 16u);
-    EXPECT_EQ(cida->aoffset[1], 16u + parentSize);
-    EXPECT_EQ(cida->aoffset[2], 16u + parentSize + fileSize);
-    EXPECT_EQ(std::memcmp(b + 16, ids, parentIds), 0) << "root and level of the first item";
-    EXPECT_EQ(*reinterpret_cast<const USHORT*>(b + 16 + parentIds), 0);
-    EXPECT_EQ(std::memcmp(b + cida->aoffset[2], ids + parentIds, fileSize), 0);
-  }
-  ReleaseStgMedium(&m_);
-
-  // The exact medium test refuses a request that also allows another medium.
-  f = Request(L"FileGroupDescriptorW", TYMED_HGLOBAL | TYMED_ISTREAM);
-  EXPECT_EQ(obj->GetData(&f, &m_), E_INVALIDARG);
-  EXPECT_EQ(obj->QueryGetData(&f), S_FALSE);
-}
-
-TEST_F(DataObject, StationsBlockLeavesOutLevelsDeletedMeanwhile) {
-  AddLevels({L"North", L"South"});
-  auto obj = ObjectFor({{L"North", true}, {L"South", false}});
-  CStationRecord gone;
-  gone.Name = L"North";
-  ASSERT_EQ(DeleteStation(gone), S_OK);
-  FORMATETC f = Request(L"Marlix Total Stations", TYMED_HGLOBAL);
-  ASSERT_EQ(obj->GetData(&f, &m_), S_OK);
-  std::vector<CStationRecord> records;
-  UnpackStations(m_.hGlobal, records);
-  ASSERT_EQ(records.size(), 1u);
-  EXPECT_EQ(records[0].Name, L"South");
-  ReleaseStgMedium(&m_);
-
-  auto empty = com::Make<CMarlixDLDataObject>();
-  ASSERT_EQ(empty->GetData(&f, &m_), S_OK);
-  EXPECT_EQ(*win::GlobalLockGuard<DWORD>(m_.hGlobal).Get(), 0u) << "a block with count 0";
-  ReleaseStgMedium(&m_);
-  m_.tymed = 0x55;
-  for (const wchar_t* name : {L"FileGroupDescriptorW", L"Shell IDList Array"}) {
-    f = Request(name, TYMED_HGLOBAL);
-    EXPECT_EQ(empty->GetData(&f, &m_), S_FALSE) << name;
-  }
-  f = Request(L"FileContents", TYMED_ISTREAM, 0);
-  EXPECT_EQ(empty->GetData(&f, &m_), S_FALSE);
-  EXPECT_EQ(m_.tymed, 0x55u) << "the medium stays untouched";
-}
-
-TEST_F(DataObject, QueriesEnumerationAndSetData) {
-  auto obj = ObjectFor({{L"A", true}});
-  FORMATETC f = Request(L"FileContents", TYMED_HGLOBAL | TYMED_ISTREAM);
-  EXPECT_EQ(obj->QueryGetData(&f), S_OK) << "the stream bit is enough";
-  f = Request(L"FileContents", TYMED_HGLOBAL);
-  EXPECT_EQ(obj->QueryGetData(&f), S_FALSE);
-  for (auto name : {L"FileGroupDescriptorW", L"Shell IDList Array", L"Preferred DropEffect", L"Marlix Total Stations"}) {
-    f = Request(name, TYMED_HGLOBAL);
-    EXPECT_EQ(obj->QueryGetData(&f), S_OK) << name;
-  }
-  com::ComPtr<IEnumFORMATETC> list;
+  com::ComPtr<IEnumFORMATETC> list, clone;
   ASSERT_EQ(obj->EnumFormatEtc(DATADIR_SET, list.Put()), S_OK);
-  FORMATETC got[8]{};
-  ULONG fetched = 0;
-  list->Next(8, got, &fetched);
-  ASSERT_EQ(fetched, 4u) << "Preferred DropEffect is answered but not listed";
-  const wchar_t* order[] = {L"FileContents", L"FileGroupDescriptorW", L"Shell IDList Array", L"Marlix Total Stations"};
-  for (int i = 0; i < 4; ++i) EXPECT_EQ(got[i].cfFormat, Request(order[i], 0).cfFormat) << order[i];
+  FORMATETC got[10]{};
+  ULONG n = 0;
+  EXPECT_EQ(list->Next(10, got, &n), S_OK) << "fewer than asked is still S_OK";
+  ASSERT_EQ(n, 4u);
+  for (int i = 0; i < 4; ++i)
+    EXPECT_TRUE(got[i].cfFormat == Request(rows[i].format, 0).cfFormat && got[i].tymed == rows[i].tymed) << i;
+  EXPECT_EQ(list->Next(1, got, &n), S_FALSE);
+  list->Reset();
+  EXPECT_EQ(list->Next(2, got, nullptr), E_POINTER);
+  EXPECT_EQ(list->Next(1, nullptr, nullptr), S_FALSE);
+  EXPECT_EQ(list->Skip(4), S_FALSE) << "exactly the end";
+  EXPECT_EQ(list->Skip(0xFFFFFFFFu), S_FALSE);
+  EXPECT_EQ(list->Skip(3), S_OK) << "the position stayed";
+  ASSERT_EQ(list->Clone(clone.Put()), S_OK);
+  EXPECT_EQ(clone->Next(1, got, nullptr), S_OK);
+  EXPECT_EQ(got[0].cfFormat, Request(rows[3].format, 0).cfFormat) << "the clone starts where its original stood";
+  EXPECT_EQ(list->Next(1, got, nullptr), S_OK) << "and the original did not move";
+  EXPECT_EQ(list->QueryInterface(IID_IUnknown, nullptr), E_POINTER);
+  EXPECT_EQ(list->QueryInterface(IID_IDataObject, reinterpret_cast<void**>(clone.Put())), E_NOINTERFACE);
+  CEnumFormatEtc* empty = CEnumFormatEtc::Create(nullptr, 0);
+  EXPECT_EQ(empty->Next(1, got, &n), S_FALSE);
+  EXPECT_EQ(empty->Skip(0), S_FALSE);
+  EXPECT_EQ(empty->Release(), 0u);
 
-  // SetData keeps nothing and leaves the medium with its owner.
-  FORMATETC text{CF_UNICODETEXT, nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
-  STGMEDIUM given{TYMED_HGLOBAL, {}, nullptr};
-  given.hGlobal = GlobalAlloc(GMEM_MOVEABLE, 8);
-  EXPECT_EQ(obj->SetData(&text, &given, TRUE), S_OK);
-  EXPECT_EQ(GlobalSize(given.hGlobal), 8u);
-  EXPECT_EQ(obj->GetData(&text, &m_), E_INVALIDARG);
-  EXPECT_EQ(obj->QueryGetData(&text), S_FALSE);
-  ReleaseStgMedium(&given);
-}
-
-TEST_F(DataObject, ContentsRefusedBeforeAnyDialog) {
-  AddLevels({L"A"});
-  auto obj = ObjectFor({{L"A", true}, {L"A", false}, {L"Gone", true}});
-  DialogDriver watch(GetCurrentThreadId(), IDCANCEL, {}, 3000);
-  for (LONG index : {-1L, 3L, LONG(0x80000000), 1L}) {
-    FORMATETC f = Request(L"FileContents", TYMED_ISTREAM, index);
-    EXPECT_EQ(obj->GetData(&f, &m_), S_FALSE) << "index " << index;
-  }
-  FORMATETC f = Request(L"FileContents", TYMED_ISTREAM, 2);
-  EXPECT_EQ(obj->GetData(&f, &m_), E_FAIL) << "FindStation's code";
-  watch.Finish();
-  EXPECT_FALSE(watch.DialogSeen());
-
-  // Any live transfer window blocks every request; a stale handle does not.
+  // A live upload dialog refuses every request too (the download dialog: below); stale handles don't.
   HWND fake = CreateWindowExW(0, L"STATIC", L"", WS_POPUP, 0, 0, 1, 1, nullptr, nullptr, nullptr, nullptr);
   FORMATETC drop = Request(L"Preferred DropEffect", TYMED_HGLOBAL);
-  for (HWND* slot : {&DownloadDialogWindow, &UploadDialogWindow}) {
-    *slot = fake;
-    EXPECT_EQ(obj->QueryGetData(&drop), E_INVALIDARG);
-    EXPECT_EQ(obj->GetData(&drop, &m_), E_INVALIDARG);
-    *slot = nullptr;
-  }
+  UploadDialogWindow = fake;
+  EXPECT_EQ(obj->QueryGetData(&drop), E_INVALIDARG);
+  EXPECT_EQ(obj->GetData(&drop, &m_), E_INVALIDARG);
   DestroyWindow(fake);
   DownloadDialogWindow = fake;
   EXPECT_EQ(obj->QueryGetData(&drop), S_OK);
-  DownloadDialogWindow = nullptr;
+  DownloadDialogWindow = UploadDialogWindow = nullptr;
+
+  // Two items: a file of North, deleted after the object was made, and South's level itself.
+  auto two = Make({L"North", L"South"}, {{L"North", true}, {L"South", false}});
+  CStationRecord gone;
+  gone.Name = L"North";
+  ASSERT_EQ(DeleteStation(gone), S_OK);
+  // The name alone for every item: the receiver learns no size, time or attributes.
+  std::vector<BYTE> group(4 + 2 * 592);
+  group[0] = 2;
+  for (size_t at : {4u, 596u}) std::memcpy(&group[at + offsetof(FILEDESCRIPTORW, cFileName)], L"file1.tkf", 20);
+  EXPECT_EQ(Fetch(two.Get(), L"FileGroupDescriptorW"), group);
+
+  // The parent of the first item, then the last id of each, at the offsets of the table.
+  const std::vector<BYTE> parent = IdList({{1, L"Marlix Digital Levels"}, {2, L"North"}}),
+                          file = IdList({{3, L"file1.tkf"}}), level = IdList({{2, L"South"}});
+  std::vector<BYTE> cida = {2, 0, 0, 0, 16, 0, 0, 0, BYTE(16 + parent.size()), 0, 0, 0,
+                            BYTE(16 + parent.size() + file.size()), 0, 0, 0};
+  for (auto* part : {&parent, &file, &level}) cida.insert(cida.end(), part->begin(), part->end());
+  EXPECT_EQ(Fetch(two.Get(), L"Shell IDList Array"), cida);
+
+  FORMATETC f = Request(L"Marlix Total Stations", TYMED_HGLOBAL);
+  ASSERT_EQ(two->GetData(&f, &m_), S_OK);
+  std::vector<CStationRecord> records;
+  UnpackStations(m_.hGlobal, records);
+  ReleaseStgMedium(&m_);
+  ASSERT_EQ(records.size(), 1u) << "North, deleted meanwhile, is left out";
+  EXPECT_EQ(records[0].Name, L"South");
+
+  // Index out of range, the level item (no file), and North's file: FindStation's code.
+  for (auto [index, expected] : {std::pair<LONG, HRESULT>{-1, S_FALSE}, {2, S_FALSE}, {LONG(0x80000000), S_FALSE},
+                                 {1, S_FALSE}, {0, E_FAIL}}) {
+    f = Request(L"FileContents", TYMED_ISTREAM, index);
+    EXPECT_EQ(two->GetData(&f, &m_), expected) << "lindex " << index;
+  }
+  EXPECT_FALSE(watch.Finish()) << "no dialog";
 }
 
-std::vector<char> ReadAll(IStream* stream) {
-  std::vector<char> all;
-  char block[4096];
-  for (ULONG got = sizeof block; got == sizeof block && stream->Read(block, sizeof block, &got) == S_OK;)
-    all.insert(all.end(), block, block + got);
-  return all;
-}
-
-TEST_F(DataObject, DownloadWhileOtherRequestsAreRefused) {
-  AddLevels({L"A"});
-  auto obj = ObjectFor({{L"A", true}});
-  auto other = ObjectFor({{L"A", true}});
+TEST_F(DataObject, EachContentsRequestIsATransferOfItsOwn) {
+  auto obj = Make({L"A", L"B"}, {{L"A", true}, {L"B", true}});
   const auto before = TransferFiles();
-  HRESULT queried = S_OK, fetched = S_OK;
-  DialogDriver driver(GetCurrentThreadId(), 220, [&](HWND) {
-    FORMATETC drop = Request(L"Preferred DropEffect", TYMED_HGLOBAL);
-    FORMATETC group = Request(L"FileGroupDescriptorW", TYMED_HGLOBAL);
+  DialogDriver driver(220, [&] {  // while it runs, every request is refused
+    FORMATETC drop = Request(L"Preferred DropEffect", TYMED_HGLOBAL), group = Request(L"FileGroupDescriptorW", TYMED_HGLOBAL);
     STGMEDIUM m{};
-    queried = other->QueryGetData(&drop);
-    fetched = other->GetData(&group, &m);
+    EXPECT_EQ(obj->QueryGetData(&drop), E_INVALIDARG);
+    EXPECT_EQ(obj->GetData(&group, &m), E_INVALIDARG);
   });
   FORMATETC f = Request(L"FileContents", TYMED_ISTREAM | TYMED_HGLOBAL, 0);
   ASSERT_EQ(obj->GetData(&f, &m_), S_OK);
   EXPECT_TRUE(driver.Finish());
-  EXPECT_EQ(queried, E_INVALIDARG);
-  EXPECT_EQ(fetched, E_INVALIDARG);
   ASSERT_EQ(m_.tymed, DWORD(TYMED_ISTREAM));
   EXPECT_EQ(m_.pUnkForRelease, nullptr);
   EXPECT_EQ(TransferFiles().size(), before.size() + 1) << "the received .txt waits";
   EXPECT_TRUE(IsStandInJob(ReadAll(m_.pstm)));
   EXPECT_EQ(TransferFiles(), before) << "the short read deleted it";
-  char more[4];
-  ULONG got = 9;
-  EXPECT_EQ(m_.pstm->Read(more, 4, &got), S_OK);
-  EXPECT_EQ(got, 0u);
   EXPECT_EQ(m_.pstm->Release(), 0u) << "one reference for the caller";
 
-  // No cache: the same request runs a new transfer, and a cancel leaves the medium alone.
-  DialogDriver cancel(GetCurrentThreadId(), IDCANCEL);
-  m_.tymed = 0x77;
-  EXPECT_EQ(obj->GetData(&f, &m_), S_FALSE);
-  EXPECT_TRUE(cancel.Finish());
-  EXPECT_EQ(m_.tymed, 0x77u);
+  // No cache: the other index, then the same again, each open a dialog; a cancel leaves the medium.
+  for (LONG index : {1, 0}) {
+    DialogDriver cancel(IDCANCEL);
+    f.lindex = index;
+    m_.tymed = 0x77;
+    EXPECT_EQ(obj->GetData(&f, &m_), S_FALSE) << "lindex " << index;
+    EXPECT_TRUE(cancel.Finish());
+    EXPECT_EQ(m_.tymed, 0x77u);
+  }
   EXPECT_EQ(DownloadDialogWindow, nullptr);
-}
-
-TEST_F(DataObject, EachIndexIsATransferAndAnEarlyReleaseKeepsTheFile) {
-  AddLevels({L"A", L"B"});
-  auto obj = ObjectFor({{L"A", true}, {L"B", true}});
-  const auto before = TransferFiles();
-  FORMATETC f = Request(L"FileContents", TYMED_ISTREAM, 1);
-  DialogDriver driver(GetCurrentThreadId(), 220);
-  ASSERT_EQ(obj->GetData(&f, &m_), S_OK);
-  EXPECT_TRUE(driver.Finish());
-  char buf[2];
-  ULONG got = 0;
-  EXPECT_EQ(m_.pstm->Read(buf, 2, &got), S_OK);
-  ReleaseStgMedium(&m_);
-  EXPECT_EQ(TransferFiles().size(), before.size() + 1) << "released before the end: the file stays";
 }
 
 TEST_F(DataObject, DragPictureIsCleanedOnlyWhenNothingIsHeld) {
   auto obj = com::Make<CMarlixDLDataObject>();
   EXPECT_EQ(obj->GiveFeedback(DROPEFFECT_COPY), DRAGDROP_S_USEDEFAULTCURSORS);
   EXPECT_FALSE(obj->DragImageShown) << "no picture: nothing";
-
-  HWND list = CreateWindowExW(0, L"STATIC", L"", WS_POPUP | WS_VISIBLE, 0, 0, 50, 50, nullptr, nullptr,
-                              nullptr, nullptr);
+  HWND list = CreateWindowExW(0, L"STATIC", L"", WS_POPUP | WS_VISIBLE, 0, 0, 50, 50, nullptr, nullptr, nullptr, nullptr);
   HIMAGELIST image = ImageList_Create(16, 16, ILC_COLOR32, 1, 1);
   ImageList_ReplaceIcon(image, -1, LoadIconW(nullptr, IDI_APPLICATION));
   obj->SetDragImage(image, list, POINT{-3, -4});
   EXPECT_EQ(obj->GiveFeedback(DROPEFFECT_COPY), DRAGDROP_S_USEDEFAULTCURSORS);
   EXPECT_TRUE(obj->DragImageShown);
   EXPECT_EQ(obj->GiveFeedback(DROPEFFECT_NONE), DRAGDROP_S_USEDEFAULTCURSORS);
-
   EXPECT_EQ(obj->QueryContinueDrag(FALSE, MK_LBUTTON), S_OK);
   EXPECT_EQ(obj->QueryContinueDrag(TRUE, MK_LBUTTON), DRAGDROP_S_CANCEL);
   EXPECT_EQ(obj->QueryContinueDrag(FALSE, MK_SHIFT), DRAGDROP_S_DROP);
-  EXPECT_TRUE(obj->DragImageShown) << "a modifier still held keeps the picture";
+  EXPECT_TRUE(obj->DragImageShown) << "neither escape nor a key still held cleans up";
   EXPECT_EQ(obj->QueryContinueDrag(FALSE, 0), DRAGDROP_S_DROP);
   EXPECT_FALSE(obj->DragImageShown);
   EXPECT_EQ(obj->DragImage, nullptr);
   EXPECT_EQ(obj->QueryContinueDrag(TRUE, 0), DRAGDROP_S_CANCEL);
   DestroyWindow(list);
+}
+
+// The read-once stream the contents come in.
+using Stream2 = DataObject;
+
+TEST_F(Stream2, ReadsOnceOnlyTheShortReadDeletesAndAMissingFileGivesTheBareCode) {
+  struct Read { ULONG ask; std::string got; bool kept; };  // and whether the file is still there
+  const struct { std::string text; std::vector<Read> reads; } cases[] = {
+      {"0123456789", {{4, "0123", true}, {4, "4567", true}, {8, "89", false}, {8, "", false}, {8, "", false}}},
+      {"abcdefgh", {{4, "abcd", true}, {4, "efgh", true}, {4, "", false}}},  // only the read of 0 bytes
+      {"abcdefgh", {{4, "abcd", true}, {4, "efgh", true}}},  // released after exactly its size: it stays
+      {"xyz", {{2, "xy", true}}}};                          // released early: it stays
+  for (auto& c : cases) {
+    SCOPED_TRACE(testing::Message() << c.text << " in " << c.reads.size() << " reads");
+    wchar_t path[MAX_PATH];
+    GetTempFileNameW(TempDir().c_str(), L"STT", 0, path);
+    std::ofstream(path, std::ios::binary) << c.text;
+    auto exists = [&] { return GetFileAttributesW(path) != INVALID_FILE_ATTRIBUTES; };
+    {
+      auto stream = com::Make<CStream2>();
+      EXPECT_EQ(stream->AttachFile(path, L"file1.tkf", true), S_OK);
+      STATSTG stat;
+      std::memset(&stat, 0xAB, sizeof stat);
+      EXPECT_EQ(stream->Stat(&stat, STATFLAG_NONAME), S_OK);
+      EXPECT_EQ(stat.cbSize.QuadPart, 0xABABABAB00000000ull + c.text.size()) << "only the low half is written";
+      for (const Read& r : c.reads) {
+        ULARGE_INTEGER pos{{77, 0}};
+        EXPECT_EQ(stream->Seek(LARGE_INTEGER{}, STREAM_SEEK_SET, &pos), S_OK);
+        EXPECT_EQ(pos.QuadPart, 77u) << "Seek reports and moves nothing";
+        char buf[8];
+        ULONG got = 99;
+        EXPECT_EQ(stream->Read(buf, r.ask, &got), S_OK);
+        EXPECT_EQ(std::string(buf, std::min<ULONG>(got, 8)), r.got);
+        EXPECT_EQ(exists(), r.kept);
+      }
+    }
+    EXPECT_EQ(exists(), c.reads.back().kept) << "the release deletes nothing";
+    DeleteFileW(path);
+  }
+  // A missing file: the first read gives the bare system code. Only IStream is answered.
+  auto stream = com::Make<CStream2>();
+  EXPECT_EQ(stream->AttachFile(L"C:\\no\\such\\dir\\gone.txt", L"file1.tkf", true), S_OK);
+  char buf[4];
+  ULONG got = 9;
+  EXPECT_EQ(stream->Read(buf, 4, &got), HRESULT(ERROR_PATH_NOT_FOUND));
+  EXPECT_EQ(got, 0u);
+  com::ComPtr<IStream> s;
+  EXPECT_EQ(stream.As(&s), S_OK);
+  com::ComPtr<ISequentialStream> seq;
+  EXPECT_EQ(stream.As(&seq), E_NOINTERFACE);
 }
 
 }  // namespace

@@ -1,109 +1,66 @@
 #include "data_test_support.h"
 
-#include <chrono>
 #include <cstring>
+#include <filesystem>
 
 #include "tools/marlix_comm/survey_job.h"
+#include "transfer/download_dialog.h"
 
-namespace {
-
-void AppendId(std::vector<BYTE>& bytes, DWORD type, const std::wstring& text) {
-  const size_t textBytes = (text.size() + 1) * 2;
-  const USHORT cb = static_cast<USHORT>(19 + textBytes);
-  const size_t at = bytes.size();
-  bytes.resize(at + cb, 0);
-  std::memcpy(&bytes[at], &cb, 2);
-  std::memcpy(&bytes[at + 2], &type, 4);
-  std::memcpy(&bytes[at + 14], text.c_str(), textBytes);
+FORMATETC Request(const wchar_t* format, DWORD tymed, LONG index) {
+  return {CLIPFORMAT(RegisterClipboardFormatW(format)), nullptr, DVASPECT_CONTENT, index, tymed};
 }
 
-bool IsDialog(HWND w, bool download) {
-  wchar_t cls[16] = {}, title[64] = {};
-  GetClassNameW(w, cls, 16);
-  GetWindowTextW(w, title, 64);
-  return IsWindowVisible(w) && std::wcscmp(cls, L"#32770") == 0 &&
-         (!download || std::wcscmp(title, L"Download file from Digital Level") == 0);
+std::vector<BYTE> IdList(std::initializer_list<std::pair<DWORD, std::wstring>> ids) {
+  std::vector<BYTE> bytes;
+  for (auto& [type, text] : ids) {
+    const size_t at = bytes.size(), textBytes = (text.size() + 1) * 2;
+    const USHORT cb = USHORT(19 + textBytes);
+    bytes.resize(at + cb, 0);
+    std::memcpy(&bytes[at], &cb, 2);
+    std::memcpy(&bytes[at + 2], &type, 4);
+    std::memcpy(&bytes[at + 14], text.c_str(), textBytes);
+  }
+  bytes.resize(bytes.size() + 2, 0);
+  return bytes;
 }
-
-BOOL CALLBACK FindDownloadDialog(HWND w, LPARAM found) {
-  if (!IsDialog(w, true)) return TRUE;
-  *reinterpret_cast<HWND*>(found) = w;
-  return FALSE;
-}
-
-// Cancel for the download dialog, OK for a message box.
-BOOL CALLBACK DismissOne(HWND w, LPARAM) {
-  if (IsDialog(w, false)) PostMessageW(w, WM_COMMAND, IsDialog(w, true) ? IDCANCEL : IDOK, 0);
-  return TRUE;
-}
-
-}  // namespace
 
 LPITEMIDLIST MakeFullList(const std::wstring& level, bool withFile) {
-  std::vector<BYTE> bytes;
-  AppendId(bytes, 1, L"Marlix Digital Levels");
-  AppendId(bytes, 2, level);
-  if (withFile) AppendId(bytes, 3, L"file1.tkf");
-  bytes.resize(bytes.size() + 2, 0);
-  auto* list = static_cast<LPITEMIDLIST>(CoTaskMemAlloc(bytes.size()));
-  std::memcpy(list, bytes.data(), bytes.size());
-  return list;
+  const std::vector<BYTE> bytes = withFile ? IdList({{1, L"Marlix Digital Levels"}, {2, level}, {3, L"file1.tkf"}})
+                                           : IdList({{1, L"Marlix Digital Levels"}, {2, level}});
+  return static_cast<LPITEMIDLIST>(std::memcpy(CoTaskMemAlloc(bytes.size()), bytes.data(), bytes.size()));
 }
 
-DialogDriver::DialogDriver(DWORD dialogThread, int button, std::function<void(HWND)> whileOpen, DWORD limitMs)
-    : whileOpen_(std::move(whileOpen)), thread_([=, this] { Run(dialogThread, button, limitMs); }) {}
+DialogDriver::DialogDriver(int button, std::function<void()> whileOpen, DWORD limitMs)
+    : whileOpen_(std::move(whileOpen)), thread_([this, button, limitMs, owner = GetCurrentThreadId()] {
+        for (ULONGLONG end = GetTickCount64() + limitMs; !stop_ && GetTickCount64() < end; Sleep(10)) {
+          HWND dialog = DownloadDialogWindow;
+          if (clicked_ || !dialog || !IsWindowVisible(dialog)) continue;
+          if (whileOpen_) whileOpen_();
+          SendMessageW(GetDlgItem(dialog, button), BM_CLICK, 0, 0);
+          clicked_ = true;
+        }
+        for (; !stop_; Sleep(50))
+          EnumThreadWindows(owner, [](HWND w, LPARAM) {
+            if (IsWindowVisible(w)) PostMessageW(w, WM_COMMAND, w == DownloadDialogWindow ? IDCANCEL : IDOK, 0);
+            return TRUE;
+          }, 0);
+      }) {}
 
-bool DialogDriver::Finish() {
-  stop_ = true;
-  if (thread_.joinable()) thread_.join();
-  return clicked_;
+std::vector<char> ReadAll(IStream* stream) {
+  std::vector<char> all;
+  char block[4096];
+  for (ULONG got = sizeof block; got == sizeof block && stream->Read(block, sizeof block, &got) == S_OK;)
+    all.insert(all.end(), block, block + got);
+  return all;
 }
 
-void DialogDriver::Run(DWORD dialogThread, int button, DWORD limitMs) {
-  const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(limitMs);
-  HWND dialog = nullptr;
-  while (!stop_ && !dialog && std::chrono::steady_clock::now() < deadline) {
-    EnumThreadWindows(dialogThread, FindDownloadDialog, reinterpret_cast<LPARAM>(&dialog));
-    if (!dialog) Sleep(10);
-  }
-  if (dialog) {
-    seen_ = true;
-    if (whileOpen_) whileOpen_(dialog);
-    SendMessageW(GetDlgItem(dialog, button), BM_CLICK, 0, 0);
-    clicked_ = true;
-  }
-  while (!stop_) {
-    if (std::chrono::steady_clock::now() >= deadline) EnumThreadWindows(dialogThread, DismissOne, 0);
-    Sleep(50);
-  }
-}
-
-namespace {
-std::wstring Env(const wchar_t* name) {
-  wchar_t value[MAX_PATH] = {};
-  return GetEnvironmentVariableW(name, value, MAX_PATH) ? value : L"";
-}
-}  // namespace
-
-PrivateTempDir::PrivateTempDir() : oldTmp_(Env(L"TMP")), oldTemp_(Env(L"TEMP")) {
-  static int n = 0;
-  dir_ = TempDir() + L"marlix_data_" + std::to_wstring(GetCurrentProcessId()) + L"_" + std::to_wstring(++n);
-  CreateDirectoryW(dir_.c_str(), nullptr);
-  SetEnvironmentVariableW(L"TMP", dir_.c_str());
-  SetEnvironmentVariableW(L"TEMP", dir_.c_str());
-}
-
-PrivateTempDir::~PrivateTempDir() {
-  SetEnvironmentVariableW(L"TMP", oldTmp_.empty() ? nullptr : oldTmp_.c_str());
-  SetEnvironmentVariableW(L"TEMP", oldTemp_.empty() ? nullptr : oldTemp_.c_str());
-  WIN32_FIND_DATAW found;
-  HANDLE h = FindFirstFileW((dir_ + L"\\*").c_str(), &found);
-  if (h != INVALID_HANDLE_VALUE) {
-    do DeleteFileW((dir_ + L"\\" + found.cFileName).c_str());
-    while (FindNextFileW(h, &found));
-    FindClose(h);
-  }
-  RemoveDirectoryW(dir_.c_str());
+bool IsStandInJob(const std::vector<char>& bytes) {
+  auto withoutDate = [](std::string job) {  // the stand-in stamps its job with the time of writing
+    const size_t at = job.find("\r\nDATE,");
+    if (at != std::string::npos) job.erase(at, job.find("\r\n", at + 2) - at);
+    return job;
+  };
+  return !bytes.empty() && withoutDate({bytes.begin(), bytes.end()}) == withoutDate(standin::MakeSurveyJob(0));
 }
 
 std::wstring TempDir() {
@@ -112,29 +69,21 @@ std::wstring TempDir() {
   return dir;
 }
 
-bool FileExists(const std::wstring& path) { return GetFileAttributesW(path.c_str()) != INVALID_FILE_ATTRIBUTES; }
+static struct PrivateTemp {
+  const std::wstring dir = TempDir() + L"marlix_data_" + std::to_wstring(GetCurrentProcessId()) + L"\\";
+  PrivateTemp() {
+    CreateDirectoryW(dir.c_str(), nullptr);
+    SetEnvironmentVariableW(L"TMP", dir.c_str());
+    SetEnvironmentVariableW(L"TEMP", dir.c_str());
+  }
+  ~PrivateTemp() { std::error_code ignored; std::filesystem::remove_all(dir, ignored); }
+} privateTemp;
 
 std::set<std::wstring> TransferFiles() {
   std::set<std::wstring> names;
   WIN32_FIND_DATAW found;
   HANDLE h = FindFirstFileW((TempDir() + L"TKF*.txt").c_str(), &found);
-  if (h == INVALID_HANDLE_VALUE) return names;
-  do names.insert(found.cFileName);
-  while (FindNextFileW(h, &found));
-  FindClose(h);
+  for (BOOL more = h != INVALID_HANDLE_VALUE; more; more = FindNextFileW(h, &found)) names.insert(found.cFileName);
+  if (h != INVALID_HANDLE_VALUE) FindClose(h);
   return names;
-}
-
-namespace {
-// The stand-in stamps its job with the time of writing; all else is fixed.
-std::string WithoutDate(std::string job) {
-  size_t at = job.find("\r\nDATE,");
-  if (at != std::string::npos) job.erase(at, job.find("\r\n", at + 2) - at);
-  return job;
-}
-}  // namespace
-
-bool IsStandInJob(const std::vector<char>& bytes) {
-  return !bytes.empty() &&
-         WithoutDate(std::string(bytes.begin(), bytes.end())) == WithoutDate(standin::MakeSurveyJob(0));
 }

@@ -1,5 +1,4 @@
-// Shared by the data object tests and the clipboard driver: item lists built byte by
-// byte, and a helper thread that works the download dialog like a user.
+// Shared by the data object tests and the clipboard driver.
 #pragma once
 #include <windows.h>
 #include <shlobj.h>
@@ -11,46 +10,31 @@
 #include <thread>
 #include <vector>
 
-// A full list: root, level and (optionally) the virtual file, from the task allocator.
+FORMATETC Request(const wchar_t* format, DWORD tymed, LONG index = -1);
+// Item ids built byte by byte (size, type, text from byte 14), with the list's terminator.
+std::vector<BYTE> IdList(std::initializer_list<std::pair<DWORD, std::wstring>> ids);
+// A full list of root, level and (optionally) the virtual file, from the task allocator.
 LPITEMIDLIST MakeFullList(const std::wstring& level, bool withFile);
 
-// Waits on a helper thread for the download dialog of `dialogThread`, runs `whileOpen`
-// there, then clicks `button` (220 Start or 2 Cancel). Whatever of that thread is still
-// open after the limit (the dialog, a message box) is dismissed, so no test can hang.
+// Works the download dialog of the calling thread from a helper thread: once it shows, runs
+// `whileOpen` and clicks `button` (220 Start, IDCANCEL); Finish tells whether it did. Past the
+// limit it cancels that thread's dialogs and confirms its message boxes, so no test can hang.
 class DialogDriver {
  public:
-  DialogDriver(DWORD dialogThread, int button, std::function<void(HWND)> whileOpen = {},
-               DWORD limitMs = 30000);
+  explicit DialogDriver(int button, std::function<void()> whileOpen = {}, DWORD limitMs = 30000);
   ~DialogDriver() { Finish(); }
-  // Joins the thread; true if the dialog came up and was clicked.
-  bool Finish();
-  bool DialogSeen() const { return seen_; }
-
+  bool Finish() { stop_ = true; if (thread_.joinable()) thread_.join(); return clicked_; }
  private:
-  void Run(DWORD dialogThread, int button, DWORD limitMs);
-
-  std::function<void(HWND)> whileOpen_;
-  std::atomic<bool> stop_{false}, seen_{false}, clicked_{false};
+  std::function<void()> whileOpen_;
+  std::atomic<bool> stop_{false}, clicked_{false};
   std::thread thread_;
 };
 
-// Whether the bytes are the job the stand-in instrument library sends.
+// Reads up to the first short read; whether the bytes are the stand-in library's job.
+std::vector<char> ReadAll(IStream* stream);
 bool IsStandInJob(const std::vector<char>& bytes);
 
-// Points this process's temporary folder (TMP, TEMP) at a fresh folder of its own for its
-// lifetime, so downloads of test programs running side by side never meet.
-class PrivateTempDir {
- public:
-  PrivateTempDir();
-  ~PrivateTempDir();
-  PrivateTempDir(const PrivateTempDir&) = delete;
-  PrivateTempDir& operator=(const PrivateTempDir&) = delete;
-
- private:
-  std::wstring dir_, oldTmp_, oldTemp_;
-};
-
+// The temporary folder: one of this process's own, made at start and removed at exit, so
+// test programs running side by side never see each other's downloads.
 std::wstring TempDir();
-bool FileExists(const std::wstring& path);
-// Names of the TKF*.txt files in the temporary folder, as downloads leave them.
-std::set<std::wstring> TransferFiles();
+std::set<std::wstring> TransferFiles();  // the TKF*.txt files downloads leave there

@@ -69,7 +69,7 @@ TEST_F(Filelog, EntriesCarryOnePrefixAndIndentFurtherLinesOrGoToStandardOutput) 
   EXPECT_EQ(CaptureStdout([] { LogTextW(L"wide"); }), "wide\r\n") << "wide text has no such test";
 }
 
-TEST_F(Filelog, RestartDeletesEarlierLogsOfTheNameAndErrorsAndHeaderFollow) {
+TEST_F(Filelog, RestartDeletesOldLogsThenErrorsHeaderAndStreamsFollow) {
   const std::wstring old = testfiles::TempDirectory() + L"marlix_logtest_1.log",
                      other = testfiles::TempDirectory() + L"marlix_logtestx_1.log";
   testfiles::WriteBytes(old, "old");
@@ -100,17 +100,15 @@ TEST_F(Filelog, RestartDeletesEarlierLogsOfTheNameAndErrorsAndHeaderFollow) {
   EXPECT_EQ(FormatByteSize(512), "512.00b");
   EXPECT_EQ(FormatByteSize(1536), "1.50Kb");
   EXPECT_EQ(FormatByteSize(3.0 * 1024 * 1024 * 1024), "3.00Gb");
-}
-
-TEST_F(Filelog, ClogBufferWritesOneEntryPerSync) {
+  // The clog buffer writes one entry per sync.
   RedirectLogStreams();
   std::clog << "one\ntwo" << std::flush;
   std::wclog << L"three" << std::flush;
   StopFilelog();
   std::clog << "restored" << std::flush;
-  const std::string text = Log();
-  EXPECT_TRUE(Has(text, " one\r\n") && Has(text, " three\r\n") && !Has(text, "restored")) << text;
-  EXPECT_TRUE(std::regex_search(text, std::regex(R"(\n {21}two\r\n)"))) << text;
+  const std::string streamed = Log();
+  EXPECT_TRUE(Has(streamed, " one\r\n") && Has(streamed, " three\r\n") && !Has(streamed, "restored")) << streamed;
+  EXPECT_TRUE(std::regex_search(streamed, std::regex(R"(\n {21}two\r\n)"))) << streamed;
 }
 
 // Kept out of line so that it stands as a frame of its own in the trace.

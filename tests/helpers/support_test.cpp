@@ -146,7 +146,7 @@ TEST(ErrorReporter, TwoModuleReportersComeFirstAndOthersJoinInOrder) {
   EXPECT_EQ(BuildErrorText(0x8004ABCD), L"# 8004abcd");
 }
 
-TEST(ErrorReporter, FacilityFourNeverReachesTheSystemTableOthersDo) {
+TEST(ErrorReporter, SystemTableInternetCodesAndNamedSources) {
   EXPECT_EQ(BuildErrorText(Code(0x80040154)), L"# 80040154");
   EXPECT_EQ(BuildErrorText(Code(0x80040111)), L"# 80040111") << "row with no text";
   EXPECT_EQ(BuildErrorText(Code(0x00040301)), L"# 40301");
@@ -163,9 +163,7 @@ TEST(ErrorReporter, FacilityFourNeverReachesTheSystemTableOthersDo) {
   // ERROR_BAD_EXE_FORMAT reads "%1 is not a valid ... application."
   EXPECT_NE(BuildErrorText(Code(0x800700C1), path.c_str(), L"2nd").find(path), std::wstring::npos);
   EXPECT_EQ(BuildErrorText(Code(0x800700C1)).find(L"%1"), std::wstring::npos);
-}
-
-TEST(ErrorReporter, InternetCodesNeedTheLibraryLoadedByOthersAndSourcesByName) {
+  // Internet codes need the library loaded by others.
   const HRESULT timeout = Code(0x80072EE2);
   if (!GetModuleHandleW(L"wininet.dll")) {
     (void)BuildErrorText(timeout);

@@ -28,9 +28,7 @@ HRESULT LoadBytes(const std::string& bytes, CTranslateFile* file) {
 
 // Parses from the end of a page followed by an inaccessible one, so that any read past the text faults.
 void ParseAtPageEnd(CTranslateFile* file, const std::wstring& text) {
-  SYSTEM_INFO info;
-  GetSystemInfo(&info);
-  const size_t bytes = text.size() * sizeof(wchar_t), page = info.dwPageSize, pages = bytes / page + 1;
+  const size_t bytes = text.size() * sizeof(wchar_t), page = 4096, pages = bytes / page + 1;
   auto* base = static_cast<char*>(VirtualAlloc(nullptr, (pages + 1) * page, MEM_RESERVE | MEM_COMMIT,
                                                PAGE_READWRITE));
   ASSERT_TRUE(base);
@@ -87,7 +85,7 @@ TEST(TranslateFile, EscapesPairingAndTails) {
   EXPECT_EQ(Parsed(L"[src]\n[last line]").Find(L"src", false), L"last line");
 }
 
-TEST(TranslateFile, RefusesAnythingButUtf16WithMark) {
+TEST(TranslateFile, LoadRefusesAnythingButUtf16WithMarkAndTakesHugeFiles) {
   struct { std::string bytes; HRESULT hr; const char* what; } rows[] = {
       {"", E_FAIL, "empty"}, {"\xFF", E_FAIL, "half a mark"}, {"\xEF\xBB\xBF[a]\r\n[b]\r\n", E_FAIL, "UTF-8"},
       {testfiles::Utf16File(L"[a]\r\n[b]\r\n").substr(2), E_FAIL, "no mark"}, {"\xFF\xFE", S_OK, "mark only"},
@@ -103,19 +101,17 @@ TEST(TranslateFile, RefusesAnythingButUtf16WithMark) {
   // A stray last byte is no character and is never read.
   EXPECT_EQ(LoadBytes(testfiles::Utf16File(L"[k]\n[v]") + "\x5D", &file), S_OK);
   EXPECT_EQ(file.Find(L"k", false), L"v");
-}
-
-TEST(TranslateFile, HugeFileIsParsedInOnePass) {
+  // A huge file is parsed in one pass.
   const std::wstring path = testfiles::TempDirectory() + L"marlix_tf_huge.txt";
   // One line of 100 MB with no closing bracket between two pairs.
   testfiles::WriteTranslation(path, L"[big]\r\n[groß]\r\n[" + std::wstring(50 << 20, L'x') +
                                         L"\r\n[end]\r\n[ende]");
-  CTranslateFile file;
-  EXPECT_EQ(file.Load(path.c_str()), S_OK);
+  CTranslateFile huge;
+  EXPECT_EQ(huge.Load(path.c_str()), S_OK);
   DeleteFileW(path.c_str());
-  EXPECT_EQ(file.Find(L"big", false), L"groß");
-  EXPECT_EQ(file.Find(L"end", false), L"ende");
-  EXPECT_EQ(file.Size(), 2u);
+  EXPECT_EQ(huge.Find(L"big", false), L"groß");
+  EXPECT_EQ(huge.Find(L"end", false), L"ende");
+  EXPECT_EQ(huge.Size(), 2u);
 }
 
 TEST(TranslateFile, RandomMutationsNeverReadPastTheEnd) {

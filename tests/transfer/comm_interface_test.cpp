@@ -1,8 +1,10 @@
-// The library contract as the system sees it: table positions, codes, the callback,
-// the temporary target path, and the registered messages.
+// The library contract as the system sees it (table positions, result texts, the callback,
+// the temporary target path) and the registered messages that carry changes among views.
 #include <gtest/gtest.h>
 
+#include <climits>
 #include <utility>
+#include <vector>
 
 #include "shell/view_notify.h"
 #include "transfer/comm_interface.h"
@@ -12,70 +14,56 @@ namespace {
 
 // A hand-made object with a 14-entry table, as the other compiler lays it out: each
 // entry records its position and first two arguments.
-struct FakeObject {
-  void** table;
-  int slot = -1;
-  long long first = 0, second = 0;
-};
-
+struct FakeObject { void** table; int slot = -1; long long first = 0, second = 0; };
 template <int Slot>
-long long Entry(FakeObject* self, long long a, long long b) {
-  *self = {self->table, Slot, a, b};
-  return 0;
-}
-
-template <int... Slots>
-void FillTable(void** table, std::integer_sequence<int, Slots...>) {
-  ((table[Slots] = reinterpret_cast<void*>(&Entry<Slots>)), ...);
-}
+long long Entry(FakeObject* self, long long a, long long b) { *self = {self->table, Slot, a, b}; return 0; }
 
 TEST(CommInterface, CallsReachTheirTablePositions) {
   void* table[14];
-  FillTable(table, std::make_integer_sequence<int, 14>());
+  [&]<int... Slots>(std::integer_sequence<int, Slots...>) {
+    ((table[Slots] = reinterpret_cast<void*>(&Entry<Slots>)), ...);
+  }(std::make_integer_sequence<int, 14>());
   FakeObject fake{table};
   auto* comm = reinterpret_cast<IMarlixComm*>(&fake);
-  auto expect = [&](int slot, long long first) {
+  auto reached = [&](int slot, long long first) {  // 32 bits: the rest of an int's register is undefined
     EXPECT_EQ(fake.slot, slot);
-    EXPECT_EQ(static_cast<int>(fake.first), first);
+    EXPECT_EQ(static_cast<int>(fake.first), static_cast<int>(first)) << "slot " << slot;
   };
-  comm->SetCommParameters(3, 19200, 2, 1, 1, 7, 0); expect(2, 3);
+  const char* path = "x";
+  comm->SetCommParameters(3, 19200, 2, 1, 1, 7, 0); reached(2, 3);
   comm->Initialize(); EXPECT_EQ(fake.slot, 3);
-  comm->ReceiveFile(20, true); expect(4, 20);
+  comm->ReceiveFile(20, true); reached(4, 20);
   EXPECT_EQ(static_cast<unsigned char>(fake.second), 1);
-  comm->SetPoints(nullptr); expect(6, 0);
+  comm->SetPoints(nullptr); reached(6, 0);
   comm->TerminateConnection(); EXPECT_EQ(fake.slot, 8);
-  comm->SetFilePath("x"); EXPECT_EQ(fake.slot, 9);
-  comm->SetTimeout(30); expect(10, 30);
-  comm->SetCallback(&CommResultCallback); EXPECT_EQ(fake.slot, 13);
-  comm->Destroy(1); expect(0, 1);
+  comm->SetFilePath(path); reached(9, reinterpret_cast<long long>(path));
+  comm->SetTimeout(30); reached(10, 30);
+  comm->SetCallback(&CommResultCallback); reached(13, reinterpret_cast<long long>(&CommResultCallback));
+  comm->Destroy(1); reached(0, 1);
 }
 
 TEST(CommInterface, ResultCodesMapToTheirTexts) {
-  EXPECT_EQ(CommResultText(0), L"No error");
-  EXPECT_EQ(CommResultText(-101), L"The waiting time of the data has expired.");
-  EXPECT_EQ(CommResultText(-102), L"The communication's process is interrupted by the user");
-  for (int code : {-201, -202, -203}) EXPECT_EQ(CommResultText(code), L"Unable to create file for saving");
-  EXPECT_EQ(CommResultText(-204), L"The checksum is incorrect");
-  EXPECT_EQ(CommResultText(-301), L"Temporary file open error");
-  EXPECT_EQ(CommResultText(-302), L"Point name or memo is wrong");
-  for (int code : {1, 101, -200, -205, -303, INT_MIN}) EXPECT_EQ(CommResultText(code), L"Unknown error");
-}
-
-DWORD WINAPI CallbackFromAnotherThread(void*) {
-  CommResultCallback(-101);
-  return 0;
+  const std::pair<std::vector<int>, const wchar_t*> rows[] = {
+      {{0}, L"No error"}, {{-101}, L"The waiting time of the data has expired."},
+      {{-102}, L"The communication's process is interrupted by the user"},
+      {{-201, -202, -203}, L"Unable to create file for saving"}, {{-204}, L"The checksum is incorrect"},
+      {{-301}, L"Temporary file open error"}, {{-302}, L"Point name or memo is wrong"},
+      {{1, -1, 101, -100, -103, -200, -205, -300, -303, INT_MIN, INT_MAX}, L"Unknown error"}};
+  for (const auto& [codes, text] : rows)
+    for (int code : codes) EXPECT_EQ(CommResultText(code), text) << "code " << code;
 }
 
 TEST(CommInterface, CallbackPostsTheSignExtendedCodeToTheOpenDialogOnly) {
-  HWND target = CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, nullptr, nullptr);
-  ASSERT_NE(target, nullptr);
   MSG message;
   CommResultCallback(5);  // no dialog: a post to a null window would land in this thread's queue
   EXPECT_FALSE(PeekMessageW(&message, nullptr, DownloadMessage, DownloadMessage, PM_REMOVE));
-
+  HWND target = CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, nullptr, nullptr);
+  ASSERT_NE(target, nullptr);
   DownloadDialogWindow = target;
-  HANDLE thread = CreateThread(nullptr, 0, CallbackFromAnotherThread, nullptr, 0, nullptr);
-  WaitForSingleObject(thread, 10000);
+  // From a thread of the library's; a sent message would time out here, as this thread pumps none.
+  auto library = [](void*) -> DWORD { CommResultCallback(-101); return 0; };
+  HANDLE thread = CreateThread(nullptr, 0, library, nullptr, 0, nullptr);
+  EXPECT_EQ(WaitForSingleObject(thread, 10000), WAIT_OBJECT_0);
   CloseHandle(thread);
   DownloadDialogWindow = nullptr;
   ASSERT_TRUE(PeekMessageW(&message, target, DownloadMessage, DownloadMessage, PM_REMOVE));
@@ -90,20 +78,58 @@ TEST(CommInterface, TargetPathIsAFreshTkfNameWithoutExtensionInTheTempFolder) {
   ASSERT_EQ(MakeDownloadTargetPath(second), 0u);
   wchar_t temp[MAX_PATH] = {};
   GetTempPathW(MAX_PATH, temp);
-  ASSERT_EQ(first.rfind(temp, 0), 0u) << first;
+  ASSERT_TRUE(first.starts_with(temp)) << first;
   std::wstring name = first.substr(wcslen(temp));
-  EXPECT_EQ(name.rfind(L"TKF", 0), 0u);
-  EXPECT_EQ(name.find(L'.'), std::wstring::npos);
+  EXPECT_TRUE(name.starts_with(L"TKF")) << name;
+  EXPECT_EQ(name.find_first_of(L".\\/"), std::wstring::npos) << name;
   EXPECT_EQ(GetFileAttributesW((first + L".tmp").c_str()), INVALID_FILE_ATTRIBUTES);  // deleted again
   EXPECT_NE(first, second);
 }
 
-TEST(CommInterface, MessagesAreRegisteredUnderTheirProtocolTexts) {
+struct Received { int count = 0; WPARAM wParam = 0; LPARAM lParam = 0; };
+LRESULT CALLBACK ViewProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+  auto* received = reinterpret_cast<Received*>(GetWindowLongPtrW(window, GWLP_USERDATA));
+  if (received && message == GlobalNotifyMessage) *received = {received->count + 1, wParam, lParam};
+  return DefWindowProcW(window, message, wParam, lParam);
+}
+
+TEST(ViewNotify, MessagesKeepTheirTextsAndABroadcastReachesEveryViewThroughItsHiddenWindow) {
   EXPECT_EQ(GlobalNotifyMessage, RegisterWindowMessageW(L"TSShell Extension - Global Notify"));
   EXPECT_EQ(DownloadMessage, RegisterWindowMessageW(L"Marlix Total Stations Shell Extension - Download Message"));
   EXPECT_EQ(UploadMessage, RegisterWindowMessageW(L"Marlix Total Stations Shell Extension - Upload Message"));
   EXPECT_EQ(GetEnumIDListMessage, RegisterWindowMessageW(L"KLD Shell Extension - Get EnumIDList"));
-  EXPECT_GE(GlobalNotifyMessage, 0xC000u);
+
+  WNDCLASSW wc{0, ViewProc, 0, 0, GetModuleHandleW(nullptr), nullptr, nullptr, nullptr, nullptr, L"NotifyTestView"};
+  RegisterClassW(&wc);
+  Received received[2];
+  HWND views[2];
+  NotifyWindowPair pairs[2];
+  for (int i = 0; i < 2; ++i) {
+    // A message-only window, which a broadcast never reaches by itself, like a view inside a browser.
+    views[i] = CreateWindowExW(0, wc.lpszClassName, L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, wc.hInstance, nullptr);
+    SetWindowLongPtrW(views[i], GWLP_USERDATA, reinterpret_cast<LONG_PTR>(&received[i]));
+    ASSERT_EQ(CreateNotifyWindow(pairs[i], views[i]), S_OK);
+  }
+  EXPECT_EQ(GetParent(pairs[0].Hidden), nullptr);
+  EXPECT_FALSE(IsWindowVisible(pairs[0].Hidden));
+  SendMessageW(pairs[0].Hidden, DownloadMessage, 1, 1);  // other messages stay away from the view
+  EXPECT_EQ(received[0].count, 0);
+  BroadcastChange(2);
+  MSG message;
+  for (ULONGLONG end = GetTickCount64() + 5000; !(received[0].count && received[1].count) && GetTickCount64() < end;
+       Sleep(10))
+    while (PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE)) DispatchMessageW(&message);
+  for (const Received& view : received) {
+    EXPECT_EQ(view.count, 1);
+    EXPECT_EQ(view.wParam, 1u);
+    EXPECT_EQ(view.lParam, 2);
+  }
+  HWND hidden = pairs[0].Hidden;
+  DestroyNotifyWindow(pairs[0]);
+  EXPECT_FALSE(IsWindow(hidden));
+  DestroyNotifyWindow(pairs[0]);  // a second time is harmless
+  DestroyNotifyWindow(pairs[1]);
+  for (HWND view : views) DestroyWindow(view);
 }
 
 }  // namespace

@@ -232,8 +232,8 @@ int RunInCopy(const wchar_t* dll, const std::string& name) {
   fs::create_directory(folder);
   fs::copy_file(Self(), folder / "copy.exe", fs::copy_options::overwrite_existing);
   if (*dll) fs::copy_file(Beside(dll), folder / "MarlixComm.dll", fs::copy_options::overwrite_existing);
-  std::wstring command = L"copy --gtest_also_run_disabled_tests --gtest_filter=DownloadDialogTest.DISABLED_" +
-                         fs::path(name).wstring();
+  std::wstring command = L"copy --gtest_also_run_disabled_tests --gtest_output=xml:result.xml "
+                        L"--gtest_filter=DownloadDialogTest.DISABLED_" + fs::path(name).wstring();
   STARTUPINFOW startup{sizeof startup};
   PROCESS_INFORMATION process{};
   DWORD code = DWORD(-1);
@@ -244,6 +244,11 @@ int RunInCopy(const wchar_t* dll, const std::string& name) {
     CloseHandle(process.hThread);
     CloseHandle(process.hProcess);
   }
+  // gtest exits 0 when its filter matches nothing: a misspelt name must not pass.
+  std::ifstream result(folder / "result.xml");
+  std::string xml((std::istreambuf_iterator<char>(result)), std::istreambuf_iterator<char>());
+  result.close();
+  if (code == 0 && xml.find("<testcase name=\"DISABLED_" + name + "\"") == std::string::npos) code = DWORD(-2);
   Sleep(200);  // let the copy's image go before deleting it
   std::error_code ignored;
   fs::remove_all(folder, ignored);

@@ -12,12 +12,7 @@ CMarlixDLExtractIcon::~CMarlixDLExtractIcon() {
 }
 
 bool CMarlixDLExtractIcon::SetItem(LPCITEMIDLIST fullList) {
-  if (!m_pidlMgr) return false;
-  LPITEMIDLIST copy = m_pidlMgr->Copy(fullList);
-  if (fullList && !copy) return false;
-  m_pidlMgr->Free(m_list);
-  m_list = copy;
-  return true;
+  return m_pidlMgr && m_pidlMgr->Assign(m_list, fullList);
 }
 
 // The index is the shell's cache key together with GIL_NOTFILENAME: no file is named.

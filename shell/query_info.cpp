@@ -16,12 +16,7 @@ CGravonQueryInfoBase::~CGravonQueryInfoBase() {
 }
 
 bool CGravonQueryInfoBase::SetItem(LPCITEMIDLIST fullList) {
-  if (!m_pidlMgr) return false;
-  LPITEMIDLIST copy = m_pidlMgr->Copy(fullList);
-  if (fullList && !copy) return false;
-  m_pidlMgr->Free(m_list);
-  m_list = copy;
-  return true;
+  return m_pidlMgr && m_pidlMgr->Assign(m_list, fullList);
 }
 
 STDMETHODIMP CGravonQueryInfoBase::GetInfoTip(DWORD, LPWSTR* text) {

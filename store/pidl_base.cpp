@@ -101,3 +101,11 @@ LPITEMIDLIST CGravonPidlManagerBase::CopyParent(LPCITEMIDLIST list) {
   std::memset(Advance(parent, head), 0, sizeof(USHORT));
   return parent;
 }
+
+bool CGravonPidlManagerBase::Assign(LPITEMIDLIST& slot, LPCITEMIDLIST list) {
+  LPITEMIDLIST copy = Copy(list);
+  if (list && !copy) return false;
+  Free(slot);
+  slot = copy;
+  return true;
+}

@@ -52,6 +52,9 @@ class CGravonPidlManagerBase {
   // All ids but the last; null for fewer than two ids.
   LPITEMIDLIST CopyParent(LPCITEMIDLIST list);
   void Free(LPCITEMIDLIST list);
+  // Replaces `slot` by a copy of `list`, freeing what it held; false, with `slot` unchanged,
+  // when a non-null list cannot be copied.
+  bool Assign(LPITEMIDLIST& slot, LPCITEMIDLIST list);
   UINT GetCount(LPCITEMIDLIST list);
   // The last id inside the list; null for a null or empty list.
   LPITEMIDLIST GetLast(LPCITEMIDLIST list);

@@ -213,15 +213,21 @@ HRESULT AddStation(CStationRecord& record) {
   return E_FAIL;
 }
 
+// Update and delete begin alike: the stored level's key name, then the open Levels key.
+// E_INVALIDARG if no level has the name, E_FAIL for an empty key name, else the registry code.
+static HRESULT FindKeyAndOpenLevels(CStationRecord stored, wchar_t (&keyName)[kKeyNameChars], win::UniqueHKey& levels) {
+  DWORD length = kKeyNameChars;
+  if (FindStation(stored, keyName, &length) != S_OK) return E_INVALIDARG;
+  if (length == 0) return E_FAIL;
+  return OpenLevelsKey(levels);
+}
+
 HRESULT UpdateStation(const std::wstring& oldName, const CStationRecord& record) {
   CStationRecord stored = record;
   stored.Name = oldName;
   wchar_t keyName[kKeyNameChars];
-  DWORD length = kKeyNameChars;
-  if (FindStation(stored, keyName, &length) != S_OK) return E_INVALIDARG;
-  if (length == 0) return E_FAIL;
   win::UniqueHKey levels;
-  if (LONG rc = OpenLevelsKey(levels); rc != ERROR_SUCCESS) return rc;
+  if (HRESULT hr = FindKeyAndOpenLevels(stored, keyName, levels); hr != S_OK) return hr;
   win::UniqueHKey key;
   DWORD disposition = 0;
   LONG rc = RegCreateKeyExW(levels.Get(), keyName, 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, key.Put(), &disposition);
@@ -248,13 +254,9 @@ LONG DeleteKeyTree(HKEY parent, const wchar_t* name) {
 }
 
 HRESULT DeleteStation(const CStationRecord& record) {
-  CStationRecord stored = record;
   wchar_t keyName[kKeyNameChars];
-  DWORD length = kKeyNameChars;
-  if (FindStation(stored, keyName, &length) != S_OK) return E_INVALIDARG;
-  if (length == 0) return E_FAIL;
   win::UniqueHKey levels;
-  if (LONG rc = OpenLevelsKey(levels); rc != ERROR_SUCCESS) return rc;
+  if (HRESULT hr = FindKeyAndOpenLevels(record, keyName, levels); hr != S_OK) return hr;
   return DeleteKeyTree(levels.Get(), keyName);
 }
 

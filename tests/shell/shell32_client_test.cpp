@@ -88,7 +88,7 @@ TEST(Shell32Client, ReachesTheFolderUnderMyComputerWalksItAndShowsItsItems) {
 TEST(Shell32ClientModule, UnloadsOnceTheShellHasLetGo) {
   HMODULE module = GetModuleHandleW(L"MarlixDLShellExt.dll");
   ASSERT_TRUE(module) << "loaded by the shell in the test before";
-  auto canUnload = reinterpret_cast<HRESULT(STDAPICALLTYPE*)()>(GetProcAddress(module, "DllCanUnloadNow"));
+  auto canUnload = reinterpret_cast<HRESULT(STDAPICALLTYPE*)()>(reinterpret_cast<void*>(GetProcAddress(module, "DllCanUnloadNow")));
   ASSERT_TRUE(canUnload);
   EXPECT_EQ(canUnload(), S_OK) << "every object of the module was released";
 }

@@ -12,15 +12,6 @@
 namespace standin {
 namespace {
 
-std::string Format(const char* format, ...) {
-  char buffer[512];
-  va_list args;
-  va_start(args, format);
-  int n = std::vsnprintf(buffer, sizeof buffer, format, args);
-  va_end(args);
-  return n < 0 ? std::string() : std::string(buffer, static_cast<size_t>(n < 512 ? n : 511));
-}
-
 // How many of the block's 10000 preset fields still hold -1.
 int IntactMarks(const PointsBlock* block) {
   int intact = 0;

@@ -1,6 +1,8 @@
 // The stand-in's control file and call log, both beside the stand-in DLL.
 #pragma once
 #include <windows.h>
+#include <cstdarg>
+#include <cstdio>
 #include <map>
 #include <string>
 
@@ -18,6 +20,16 @@ class Settings {
 
 // Appends one line to MarlixComm.log. Safe from any thread.
 void Log(const std::string& line);
+
+// printf into a string; longer results are cut at 511 characters.
+inline std::string Format(const char* format, ...) {
+  char buffer[512];
+  va_list args;
+  va_start(args, format);
+  int n = std::vsnprintf(buffer, sizeof buffer, format, args);
+  va_end(args);
+  return n < 0 ? std::string() : std::string(buffer, static_cast<size_t>(n < 512 ? n : 511));
+}
 
 // A path beside the stand-in DLL.
 std::wstring BesideModule(const wchar_t* fileName);

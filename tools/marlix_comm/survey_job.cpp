@@ -1,5 +1,7 @@
 #include "survey_job.h"
 
+#include "stand_in_files.h"
+
 #include <windows.h>
 #include <cstdarg>
 #include <cstdio>
@@ -17,15 +19,6 @@ struct Readings {
   }
 };
 
-std::string Line(const char* format, ...) {
-  char buffer[256];
-  va_list args;
-  va_start(args, format);
-  int n = std::vsnprintf(buffer, sizeof buffer, format, args);
-  va_end(args);
-  if (n < 0) return {};
-  return std::string(buffer, static_cast<size_t>(n < 256 ? n : 255));
-}
 }  // namespace
 
 std::string MakeSurveyJob(size_t size) {
@@ -33,7 +26,7 @@ std::string MakeSurveyJob(size_t size) {
   GetLocalTime(&now);
   std::string job;
   job += "JOB,LEVEL LINE BM1-BM2\r\n";
-  job += Line("DATE,%04u-%02u-%02u,%02u:%02u:%02u\r\n", now.wYear, now.wMonth, now.wDay,
+  job += Format("DATE,%04u-%02u-%02u,%02u:%02u:%02u\r\n", now.wYear, now.wMonth, now.wDay,
               now.wHour, now.wMinute, now.wSecond);
   job += "INSTRUMENT,HRA20,SN 104532\r\n";
   job += "UNITS,METRE\r\n";
@@ -42,7 +35,7 @@ std::string MakeSurveyJob(size_t size) {
 
   Readings readings;
   long height = 1000000;  // tenths of a millimetre: 100.0000 m
-  job += Line("BM1,BM,,,,%ld.%04ld\r\n", height / 10000, height % 10000);
+  job += Format("BM1,BM,,,,%ld.%04ld\r\n", height / 10000, height % 10000);
   const size_t target = size > 0 ? size : 2000;
   for (int point = 1; job.size() < target; ++point) {
     int back = 8000 + readings.Next(12000);
@@ -51,9 +44,9 @@ std::string MakeSurveyJob(size_t size) {
     int foreDistance = 1500 + readings.Next(2000);
     if (height < 200000 && fore > back) std::swap(back, fore);  // stay above ground
     height += back - fore;
-    job += Line("TP%d,BS,%d.%04d,,%d.%02d,\r\n", point, back / 10000, back % 10000,
+    job += Format("TP%d,BS,%d.%04d,,%d.%02d,\r\n", point, back / 10000, back % 10000,
                 backDistance / 100, backDistance % 100);
-    job += Line("TP%d,FS,,%d.%04d,%d.%02d,%ld.%04ld\r\n", point, fore / 10000, fore % 10000,
+    job += Format("TP%d,FS,,%d.%04d,%d.%02d,%ld.%04ld\r\n", point, fore / 10000, fore % 10000,
                 foreDistance / 100, foreDistance % 100, height / 10000, height % 10000);
   }
   job += "END\r\n";

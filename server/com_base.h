@@ -109,4 +109,17 @@ ComPtr<T> Make(Args&&... args) noexcept {
   return ComPtr<T>::Attach(new (std::nothrow) T(std::forward<Args>(args)...));
 }
 
+// The body of a class object's creator: a new object asked for `riid`. A class whose
+// constructor can fail to get what it needs reports it through IsUsable().
+template <class T>
+HRESULT CreateInstance(REFIID riid, void** ppv) noexcept {
+  if (!ppv) return E_POINTER;
+  *ppv = nullptr;
+  auto object = Make<T>();
+  if (!object) return E_OUTOFMEMORY;
+  if constexpr (requires { object->IsUsable(); })
+    if (!object->IsUsable()) return E_OUTOFMEMORY;
+  return object->QueryInterface(riid, ppv);
+}
+
 }  // namespace com

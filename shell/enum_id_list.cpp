@@ -144,10 +144,4 @@ HRESULT CMarlixDLEnumIDList::AddLevels(const std::wstring& path) {
   return S_OK;
 }
 
-HRESULT CreateMarlixDLEnumIDList(REFIID riid, void** ppv) {
-  if (!ppv) return E_POINTER;
-  *ppv = nullptr;
-  auto list = com::Make<CMarlixDLEnumIDList>();
-  if (!list) return E_OUTOFMEMORY;
-  return list->QueryInterface(riid, ppv);
-}
+HRESULT CreateMarlixDLEnumIDList(REFIID riid, void** ppv) { return com::CreateInstance<CMarlixDLEnumIDList>(riid, ppv); }

@@ -38,10 +38,4 @@ STDMETHODIMP CMarlixDLExtractIcon::Extract(LPCWSTR, UINT index, HICON* large, HI
   return S_OK;
 }
 
-HRESULT CreateMarlixDLExtractIcon(REFIID riid, void** ppv) {
-  if (!ppv) return E_POINTER;
-  *ppv = nullptr;
-  auto icon = com::Make<CMarlixDLExtractIcon>();
-  if (!icon || !icon->IsUsable()) return E_OUTOFMEMORY;
-  return icon->QueryInterface(riid, ppv);
-}
+HRESULT CreateMarlixDLExtractIcon(REFIID riid, void** ppv) { return com::CreateInstance<CMarlixDLExtractIcon>(riid, ppv); }

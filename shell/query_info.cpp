@@ -37,10 +37,4 @@ STDMETHODIMP CGravonQueryInfoBase::GetInfoFlags(DWORD*) { return E_NOTIMPL; }
 
 CMarlixDLQueryInfo::CMarlixDLQueryInfo() : CGravonQueryInfoBase(new (std::nothrow) CPidlMgr) {}
 
-HRESULT CreateMarlixDLQueryInfo(REFIID riid, void** ppv) {
-  if (!ppv) return E_POINTER;
-  *ppv = nullptr;
-  auto info = com::Make<CMarlixDLQueryInfo>();
-  if (!info || !info->IsUsable()) return E_OUTOFMEMORY;
-  return info->QueryInterface(riid, ppv);
-}
+HRESULT CreateMarlixDLQueryInfo(REFIID riid, void** ppv) { return com::CreateInstance<CMarlixDLQueryInfo>(riid, ppv); }

@@ -16,10 +16,4 @@ STDMETHODIMP CMarlixDLShellFolder::GetClassID(CLSID* classId) {
   return S_OK;
 }
 
-HRESULT CreateMarlixDLShellFolder(REFIID riid, void** ppv) {
-  if (!ppv) return E_POINTER;
-  *ppv = nullptr;
-  auto folder = com::Make<CMarlixDLShellFolder>();
-  if (!folder || !folder->IsUsable()) return E_OUTOFMEMORY;
-  return folder->QueryInterface(riid, ppv);
-}
+HRESULT CreateMarlixDLShellFolder(REFIID riid, void** ppv) { return com::CreateInstance<CMarlixDLShellFolder>(riid, ppv); }

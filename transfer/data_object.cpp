@@ -276,10 +276,4 @@ STDMETHODIMP CMarlixDLDataObject::GiveFeedback(DWORD) {
   return DRAGDROP_S_USEDEFAULTCURSORS;
 }
 
-HRESULT CreateMarlixDLDataObject(REFIID riid, void** ppv) {
-  if (!ppv) return E_POINTER;
-  *ppv = nullptr;
-  auto object = com::Make<CMarlixDLDataObject>();
-  if (!object) return E_OUTOFMEMORY;
-  return object->QueryInterface(riid, ppv);
-}
+HRESULT CreateMarlixDLDataObject(REFIID riid, void** ppv) { return com::CreateInstance<CMarlixDLDataObject>(riid, ppv); }

@@ -7,8 +7,8 @@
 #include <cstdio>
 #include <vector>
 
-#include "server/module_instance.h"
-#include "server/resource_ids.h"
+#include "base/module_instance.h"
+#include "base/resource_ids.h"
 #include "transfer/download_dialog.h"
 
 namespace {

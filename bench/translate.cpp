@@ -11,7 +11,7 @@
 #include "helpers/app_helpers.h"
 #include "helpers/translate_file.h"
 #include "helpers/translate_manager.h"
-#include "server/module_instance.h"
+#include "base/module_instance.h"
 #include "store/string_table.h"
 
 namespace {

@@ -1,6 +1,6 @@
 #include "server/dialog_base.h"
 
-#include "server/module_instance.h"
+#include "base/module_instance.h"
 
 std::wstring WindowText(HWND window) {
   int length = GetWindowTextLengthW(window);

@@ -1,7 +1,7 @@
 #include "server/module_app.h"
 
 #include "server/class_ids.h"
-#include "server/module_instance.h"
+#include "base/module_instance.h"
 #include "shell/item_services.h"
 #include "store/station_record.h"
 

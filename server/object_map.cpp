@@ -2,7 +2,7 @@
 
 #include "server/class_creators.h"
 #include "server/class_ids.h"
-#include "server/resource_ids.h"
+#include "base/resource_ids.h"
 
 namespace {
 const ObjectMapEntry kObjectMap[] = {

@@ -1,5 +1,7 @@
 # Generated resources of the module: the type library, compiled by widl from the IDL.
-find_program(MARLIX_WIDL widl NO_CMAKE_FIND_ROOT_PATH REQUIRED)
+# Debian's wine64-tools installs the compiler as widl-stable and under /usr/lib/wine; only
+# the full wine package adds the plain name.
+find_program(MARLIX_WIDL NAMES widl widl-stable PATHS /usr/lib/wine NO_CMAKE_FIND_ROOT_PATH REQUIRED)
 find_path(MARLIX_WIDL_INCLUDE unknwn.idl PATHS /usr/include/wine/wine/windows /usr/include/wine/windows
           NO_CMAKE_FIND_ROOT_PATH REQUIRED)
 
@@ -16,7 +18,7 @@ add_custom_target(marlix_typelib DEPENDS ${MARLIX_TYPELIB})
 add_dependencies(marlix_core marlix_typelib)
 
 # Files that module.rc pulls in without #include, so that a change recompiles it.
-file(GLOB MARLIX_MODULE_RC_DEPENDS CONFIGURE_DEPENDS ${CMAKE_SOURCE_DIR}/server/*.rgs
+file(GLOB MARLIX_MODULE_RC_DEPENDS CONFIGURE_DEPENDS ${CMAKE_SOURCE_DIR}/server/*.rgs ${CMAKE_SOURCE_DIR}/base/resource_ids.h
      ${CMAKE_SOURCE_DIR}/server/*.rc)
 list(APPEND MARLIX_MODULE_RC_DEPENDS ${MARLIX_TYPELIB})
 

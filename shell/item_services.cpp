@@ -2,8 +2,8 @@
 
 #include <initializer_list>
 
-#include "server/module_instance.h"
-#include "server/resource_ids.h"
+#include "base/module_instance.h"
+#include "base/resource_ids.h"
 
 HIMAGELIST LargeImageList = nullptr;
 HIMAGELIST SmallImageList = nullptr;

@@ -1,13 +1,6 @@
 #include "shell/view_notify.h"
 
-#include "server/module_instance.h"
-
-UINT GlobalNotifyMessage = RegisterWindowMessageW(L"TSShell Extension - Global Notify");
-UINT DownloadMessage =
-    RegisterWindowMessageW(L"Marlix Total Stations Shell Extension - Download Message");
-UINT UploadMessage =
-    RegisterWindowMessageW(L"Marlix Total Stations Shell Extension - Upload Message");
-UINT GetEnumIDListMessage = RegisterWindowMessageW(L"KLD Shell Extension - Get EnumIDList");
+#include "base/module_instance.h"
 
 void BroadcastChange(UINT lastIdType) {
   PostMessageW(HWND_BROADCAST, GlobalNotifyMessage, 1, static_cast<LPARAM>(lastIdType));

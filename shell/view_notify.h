@@ -1,13 +1,9 @@
-// Change notification among views: the registered messages of the module and the
-// hidden top-level window through which a view (a child window) hears broadcasts.
+// Change notification among views: the hidden top-level window through which a view
+// (a child window) hears broadcasts.
 #pragma once
 #include <windows.h>
 
-// Registered when the module loads; equal in every process of the session.
-extern UINT GlobalNotifyMessage;   // "TSShell Extension - Global Notify"
-extern UINT DownloadMessage;       // "Marlix Total Stations Shell Extension - Download Message"
-extern UINT UploadMessage;         // "Marlix Total Stations Shell Extension - Upload Message"
-extern UINT GetEnumIDListMessage;  // "KLD Shell Extension - Get EnumIDList"
+#include "base/window_messages.h"
 
 constexpr wchar_t kNotifyWindowClass[] = L"KLD Net Shell Extension - Notify";
 

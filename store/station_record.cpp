@@ -6,7 +6,7 @@
 #include <cwchar>
 
 #include "helpers/win_handles.h"
-#include "server/resource_ids.h"
+#include "base/resource_ids.h"
 #include "store/string_table.h"
 
 int ColumnWidths[2] = {100, 100};

@@ -1,7 +1,7 @@
 #include "store/string_table.h"
 
 #include "helpers/translate_manager.h"
-#include "server/module_instance.h"
+#include "base/module_instance.h"
 
 namespace {
 

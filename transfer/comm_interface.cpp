@@ -4,9 +4,9 @@
 
 #include "helpers/error_reporter.h"
 #include "helpers/file_helpers.h"
-#include "server/module_instance.h"
-#include "server/resource_ids.h"
-#include "shell/view_notify.h"
+#include "base/module_instance.h"
+#include "base/resource_ids.h"
+#include "base/window_messages.h"
 #include "store/string_table.h"
 #include "transfer/download_dialog.h"
 

@@ -2,8 +2,8 @@
 
 #include "helpers/error_reporter.h"
 #include "helpers/file_helpers.h"
-#include "server/resource_ids.h"
-#include "shell/view_notify.h"
+#include "base/resource_ids.h"
+#include "base/window_messages.h"
 #include "store/string_table.h"
 
 HWND DownloadDialogWindow = nullptr;

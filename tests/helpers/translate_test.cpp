@@ -7,7 +7,7 @@
 #include "helpers/app_helpers.h"
 #include "helpers/translate_file.h"
 #include "helpers/translate_manager.h"
-#include "server/module_instance.h"
+#include "base/module_instance.h"
 #include "test_files.h"
 
 using namespace kld::ft;

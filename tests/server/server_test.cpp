@@ -8,7 +8,7 @@
 #include "server/class_ids.h"
 #include "server/com_base.h"
 #include "server/registrar.h"
-#include "server/resource_ids.h"
+#include "base/resource_ids.h"
 #include "server/server_module.h"
 #include "support/registry_sandbox.h"
 

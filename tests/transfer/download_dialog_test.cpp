@@ -10,7 +10,7 @@
 #include <thread>
 
 #include "helpers/error_reporter.h"
-#include "server/resource_ids.h"
+#include "base/resource_ids.h"
 #include "store/string_table.h"
 #include "transfer/download_dialog.h"
 

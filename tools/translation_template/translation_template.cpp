@@ -11,7 +11,7 @@
 #include <vector>
 
 #include "helpers/translate_file.h"
-#include "server/module_instance.h"
+#include "base/module_instance.h"
 
 namespace {
 

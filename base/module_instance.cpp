@@ -1,4 +1,4 @@
-#include "server/module_instance.h"
+#include "base/module_instance.h"
 
 extern "C" IMAGE_DOS_HEADER __ImageBase;
 

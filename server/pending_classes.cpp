@@ -10,5 +10,3 @@ HRESULT NotAvailable(void** ppv) {
 }  // namespace
 
 HRESULT CreateMarlixDLShellView(REFIID, void** ppv) { return NotAvailable(ppv); }
-HRESULT CreateMarlixDLDropTarget(REFIID, void** ppv) { return NotAvailable(ppv); }
-HRESULT CreateMarlixDLDropTargetOnListView(REFIID, void** ppv) { return NotAvailable(ppv); }

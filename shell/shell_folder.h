@@ -9,12 +9,13 @@
 #include "shell/query_info.h"
 #include "shell/shell_folder_impl.h"
 #include "transfer/data_object.h"
+#include "transfer/drop_target.h"
 
 // The classes the folder hands out that live elsewhere; each becomes its real class
 // here once it is in the module.
 using MarlixDLShellViewClass = CClassNotAvailable;   // CMarlixDLShellView
 using MarlixDLDataObjectClass = CMarlixDLDataObject;
-using MarlixDLDropTargetClass = CClassNotAvailable;  // CMarlixDLDropTarget
+using MarlixDLDropTargetClass = CMarlixDLDropTarget;
 
 class CMarlixDLShellFolder
     : public CGravonShellFolderImpl<CMarlixDLShellFolder, MarlixDLShellViewClass, CMarlixDLEnumIDList,

@@ -33,3 +33,11 @@ function(marlix_test name)
   add_test(NAME ${name} COMMAND ${name})
   marlix_wine_test(${name})
 endfunction()
+
+# A receiver of virtual files in a process of its own, as Explorer is one (drop or paste).
+# Test programs get its Windows path from MARLIX_FILE_RECEIVER.
+add_executable(file_receiver ${CMAKE_SOURCE_DIR}/tests/support/file_receiver.cpp)
+target_link_options(file_receiver PRIVATE -municode)
+target_link_libraries(file_receiver PRIVATE ole32 shell32 uuid)
+set_target_properties(file_receiver PROPERTIES RUNTIME_OUTPUT_DIRECTORY ${CMAKE_BINARY_DIR}/tests/bin)
+string(REPLACE "/" "\\" MARLIX_FILE_RECEIVER "Z:${CMAKE_BINARY_DIR}/tests/bin/file_receiver.exe")

@@ -1,6 +1,6 @@
-// Two processes and the real OLE clipboard. "owner" puts a level's file on the clipboard,
-// starts "reader" and works its own download dialog; "reader" takes the descriptor and then
-// the contents through OLE's marshalling and checks the bytes; the owner, that no file stays.
+// Two processes and the real OLE clipboard. The driver puts a level's file on the clipboard,
+// starts the file receiver, which pastes it as Explorer would, and works its own download
+// dialog meanwhile; then it checks the bytes the receiver wrote and that no file stays.
 #include <windows.h>
 #include <ole2.h>
 #include <process.h>
@@ -21,25 +21,7 @@ int Fail(const char* what, long code = 0) {
   return 1;
 }
 
-int Reader() {
-  com::ComPtr<IDataObject> clip;
-  FORMATETC f = Request(L"FileGroupDescriptorW", TYMED_HGLOBAL);
-  STGMEDIUM m{};
-  HRESULT hr = OleGetClipboard(clip.Put());
-  if (FAILED(hr) || (hr = clip->GetData(&f, &m)) != S_OK) return Fail("descriptor", hr);
-  const FILEGROUPDESCRIPTORW group = *win::GlobalLockGuard<FILEGROUPDESCRIPTORW>(m.hGlobal).Get();
-  ReleaseStgMedium(&m);
-  if (group.cItems != 1 || std::wcscmp(group.fgd[0].cFileName, L"file1.tkf")) return Fail("descriptor contents");
-  f = Request(L"FileContents", TYMED_ISTREAM, 0);
-  if ((hr = clip->GetData(&f, &m)) != S_OK || m.tymed != TYMED_ISTREAM) return Fail("contents", hr);
-  const std::vector<char> bytes = ReadAll(m.pstm);
-  ReleaseStgMedium(&m);
-  if (!IsStandInJob(bytes)) return Fail("bytes differ from the stand-in's job", long(bytes.size()));
-  std::printf("ok: %zu bytes through the clipboard\n", bytes.size());
-  return 0;
-}
-
-int Owner() {
+int Owner(const wchar_t* receiver) {
   RegistrySandbox sandbox;
   CStationRecord level;
   level.Name = L"Clip";
@@ -51,9 +33,9 @@ int Owner() {
     if (HRESULT hr = OleSetClipboard(data.Get()); FAILED(hr)) return Fail("OleSetClipboard", hr);
   }  // the clipboard holds the only reference now
   DialogDriver driver(220, {}, 60000);
-  wchar_t self[MAX_PATH] = {};
-  GetModuleFileNameW(nullptr, self, MAX_PATH);
-  HANDLE reader = HANDLE(_wspawnl(_P_NOWAIT, self, L"driver", L"reader", nullptr));
+  const std::wstring folder = TempDir() + L"marlix_paste_" + std::to_wstring(GetCurrentProcessId());
+  CreateDirectoryW(folder.c_str(), nullptr);
+  HANDLE reader = HANDLE(_wspawnl(_P_NOWAIT, receiver, L"receiver", L"paste", folder.c_str(), nullptr));
   if (reader == INVALID_HANDLE_VALUE) return Fail("starting the reader");
   DWORD index, readerCode = 1;  // the apartment serves the reader's calls until it ends
   if (CoWaitForMultipleHandles(COWAIT_DISPATCH_WINDOW_MESSAGES | COWAIT_DISPATCH_CALLS, 60000, 1,
@@ -66,15 +48,21 @@ int Owner() {
   if (!clicked) return Fail("download dialog never came up");
   if (readerCode != 0) return Fail("reader", long(readerCode));
   if (TransferFiles() != before) return Fail("a temporary .txt file stayed behind");
+  std::vector<char> bytes;
+  if (FILE* file = _wfopen((folder + L"\\file1.tkf").c_str(), L"rb")) {
+    for (int c; (c = std::fgetc(file)) != EOF;) bytes.push_back(char(c));
+    std::fclose(file);
+  }
+  if (!IsStandInJob(bytes)) return Fail("the pasted file1.tkf is not the stand-in's job", long(bytes.size()));
+  std::printf("ok: %zu bytes through the clipboard\n", bytes.size());
   return 0;
 }
 
 }  // namespace
 
-int main() {
-  const std::wstring command = GetCommandLineW();
-  if (FAILED(OleInitialize(nullptr))) return 3;
-  const int rc = command.ends_with(L" owner") ? Owner() : command.ends_with(L" reader") ? Reader() : 2;
+int wmain(int argc, wchar_t** argv) {
+  if (argc < 2 || FAILED(OleInitialize(nullptr))) return 3;
+  const int rc = Owner(argv[1]);
   OleUninitialize();
   return rc;
 }

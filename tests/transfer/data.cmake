@@ -14,12 +14,13 @@ marlix_test(data_tests SOURCES
 set_target_properties(data_tests PROPERTIES RUNTIME_OUTPUT_DIRECTORY ${MARLIX_DATA_TEST_DIR})
 marlix_copy_standin(data_tests)
 
-# "owner" starts "reader" as a second process of the same program.
+# The driver owns the clipboard; the file receiver pastes from it in a process of its own.
 add_executable(data_clipboard_driver ${CMAKE_CURRENT_SOURCE_DIR}/clipboard_driver.cpp
   ${MARLIX_DATA_TEST_SUPPORT} ${MARLIX_MODULE_RC})
 marlix_module_rc_depends()
 target_link_libraries(data_clipboard_driver PRIVATE marlix_test_support)
 set_target_properties(data_clipboard_driver PROPERTIES RUNTIME_OUTPUT_DIRECTORY ${MARLIX_DATA_TEST_DIR})
 marlix_copy_standin(data_clipboard_driver)
-add_test(NAME data_clipboard COMMAND ${MARLIX_WINE_RUN} $<TARGET_FILE:data_clipboard_driver> owner)
+add_dependencies(data_clipboard_driver file_receiver)
+add_test(NAME data_clipboard COMMAND ${MARLIX_WINE_RUN} $<TARGET_FILE:data_clipboard_driver> ${MARLIX_FILE_RECEIVER})
 marlix_wine_test(data_clipboard)

@@ -34,10 +34,10 @@ function(marlix_test name)
   marlix_wine_test(${name})
 endfunction()
 
-# A receiver of virtual files in a process of its own, as Explorer is one (drop or paste).
-# Test programs get its Windows path from MARLIX_FILE_RECEIVER.
-add_executable(file_receiver ${CMAKE_SOURCE_DIR}/tests/support/file_receiver.cpp)
-target_link_options(file_receiver PRIVATE -municode)
-target_link_libraries(file_receiver PRIVATE ole32 shell32 uuid)
-set_target_properties(file_receiver PROPERTIES RUNTIME_OUTPUT_DIRECTORY ${CMAKE_BINARY_DIR}/tests/bin)
-string(REPLACE "/" "\\" MARLIX_FILE_RECEIVER "Z:${CMAKE_BINARY_DIR}/tests/bin/file_receiver.exe")
+# A second process acting as the shell would: receiver of virtual files (drop or paste), drag source.
+# Test programs get its Windows path from MARLIX_SHELL_PEER.
+add_executable(shell_peer ${CMAKE_SOURCE_DIR}/tests/support/shell_peer.cpp)
+target_link_options(shell_peer PRIVATE -municode)
+target_link_libraries(shell_peer PRIVATE ole32 shell32 uuid)
+set_target_properties(shell_peer PROPERTIES RUNTIME_OUTPUT_DIRECTORY ${CMAKE_BINARY_DIR}/tests/bin)
+string(REPLACE "/" "\\" MARLIX_SHELL_PEER "Z:${CMAKE_BINARY_DIR}/tests/bin/shell_peer.exe")

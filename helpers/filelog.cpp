@@ -10,6 +10,7 @@
 #include <mutex>
 #include <vector>
 
+#include "base/boundary.h"
 #include "helpers/error_reporter.h"
 
 namespace kld::ft {
@@ -199,17 +200,15 @@ void LogTextA(const char* format, ...) {
   if (logFile == INVALID_HANDLE_VALUE) return;
   va_list args;
   va_start(args, format);
-  std::string text = FormatA(format, args);
+  boundary::CallVoid([&] { WriteLogEntry(LogEntryPrefix(), FormatA(format, args)); });
   va_end(args);
-  WriteLogEntry(LogEntryPrefix(), text);
 }
 
 void LogTextW(const wchar_t* format, ...) {
   va_list args;
   va_start(args, format);
-  std::wstring text = FormatW(format, args);
+  boundary::CallVoid([&] { WriteLogEntry(LogEntryPrefix(), NarrowText(FormatW(format, args))); });
   va_end(args);
-  WriteLogEntry(LogEntryPrefix(), NarrowText(text));
 }
 
 void LogError(const char* file, int line, const wchar_t* text, HRESULT code, ...) {

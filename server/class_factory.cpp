@@ -1,10 +1,12 @@
 #include "server/class_factory.h"
 
+#include "base/boundary.h"
+
 STDMETHODIMP CClassFactory::CreateInstance(IUnknown* outer, REFIID riid, void** ppv) {
   if (!ppv) return E_POINTER;
   *ppv = nullptr;
   if (outer) return CLASS_E_NOAGGREGATION;
-  return create_(riid, ppv);
+  return boundary::Call([&] { return create_(riid, ppv); });
 }
 
 STDMETHODIMP CClassFactory::LockServer(BOOL lock) {

@@ -103,10 +103,15 @@ class ComObject : public Interfaces... {
   std::atomic<ULONG> refs_{1};
 };
 
-// new without exceptions, handing the one reference to a smart pointer.
+// new without exceptions, handing the one reference to a smart pointer; null also when
+// the constructor throws.
 template <class T, class... Args>
 ComPtr<T> Make(Args&&... args) noexcept {
-  return ComPtr<T>::Attach(new (std::nothrow) T(std::forward<Args>(args)...));
+  try {
+    return ComPtr<T>::Attach(new (std::nothrow) T(std::forward<Args>(args)...));
+  } catch (...) {
+    return {};
+  }
 }
 
 // The body of a class object's creator: a new object asked for `riid`. A class whose

@@ -1,5 +1,6 @@
 #include "server/dialog_base.h"
 
+#include "base/boundary.h"
 #include "base/module_instance.h"
 
 std::wstring WindowText(HWND window) {
@@ -148,7 +149,12 @@ bool CDialog::Dispatch(UINT message, WPARAM wParam, LPARAM lParam, INT_PTR& resu
   }
 }
 
+// A handler that throws gets the default handling: FALSE, not processed.
 INT_PTR CALLBACK CDialog::DialogProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+  return boundary::CallOr<INT_PTR>(FALSE, [&] { return Route(window, message, wParam, lParam); });
+}
+
+INT_PTR CDialog::Route(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
   CDialog* self;
   if (message == WM_INITDIALOG) {
     self = reinterpret_cast<CDialog*>(lParam);

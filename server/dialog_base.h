@@ -54,6 +54,7 @@ class CDialog {
 
  private:
   static INT_PTR CALLBACK DialogProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
+  static INT_PTR Route(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
   bool Dispatch(UINT message, WPARAM wParam, LPARAM lParam, INT_PTR& result);
   static std::wstring ComboText(HWND combo);
 

@@ -3,6 +3,7 @@
 #include <cstring>
 #include <new>
 
+#include "base/boundary.h"
 #include "server/class_creators.h"
 #include "store/pidl_manager.h"
 
@@ -23,14 +24,16 @@ STDMETHODIMP CGravonQueryInfoBase::GetInfoTip(DWORD, LPWSTR* text) {
   if (!text) return E_INVALIDARG;
   *text = nullptr;
   if (!IsUsable()) return E_OUTOFMEMORY;
-  wchar_t path[MAX_PATH] = {};
-  UINT length = m_pidlMgr->GetPath(m_list, path, MAX_PATH);
-  auto* tip = static_cast<wchar_t*>(m_malloc->Alloc((length + 1) * sizeof(wchar_t)));
-  if (!tip) return E_OUTOFMEMORY;
-  std::memcpy(tip, path, length * sizeof(wchar_t));
-  tip[length] = 0;
-  *text = tip;
-  return S_OK;
+  return boundary::Call([&] {
+    wchar_t path[MAX_PATH] = {};
+    UINT length = m_pidlMgr->GetPath(m_list, path, MAX_PATH);
+    auto* tip = static_cast<wchar_t*>(m_malloc->Alloc((length + 1) * sizeof(wchar_t)));
+    if (!tip) return E_OUTOFMEMORY;
+    std::memcpy(tip, path, length * sizeof(wchar_t));
+    tip[length] = 0;
+    *text = tip;
+    return S_OK;
+  });
 }
 
 STDMETHODIMP CGravonQueryInfoBase::GetInfoFlags(DWORD*) { return E_NOTIMPL; }

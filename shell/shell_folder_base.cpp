@@ -5,6 +5,7 @@
 #include <new>
 #include <string>
 
+#include "base/boundary.h"
 #include "store/pidl_manager.h"
 
 CGravonShellFolderBase::CGravonShellFolderBase(CGravonPidlManagerBase* pidlMgr) : m_pidlMgr(pidlMgr) {
@@ -76,7 +77,7 @@ HRESULT CGravonShellFolderBase::Init(CGravonShellFolderBase* parent, LPCITEMIDLI
 }
 
 STDMETHODIMP CGravonShellFolderBase::Initialize(PCIDLIST_ABSOLUTE) {
-  return Init(nullptr, nullptr);
+  return boundary::Call([&] { return Init(nullptr, nullptr); });
 }
 
 // The name is a path below this folder; the store is not asked, so any level name parses.
@@ -85,7 +86,7 @@ STDMETHODIMP CGravonShellFolderBase::ParseDisplayName(HWND, IBindCtx*, LPWSTR na
   if (!result) return E_INVALIDARG;
   *result = nullptr;
   if (!name || !IsUsable()) return E_INVALIDARG;
-  try {
+  return boundary::Call([&] {
     wchar_t folder[MAX_PATH];
     GetFolderPath(folder, MAX_PATH, false);
     std::wstring full = std::wstring(folder) + L'\\' + name;
@@ -102,9 +103,7 @@ STDMETHODIMP CGravonShellFolderBase::ParseDisplayName(HWND, IBindCtx*, LPWSTR na
     }
     m_pidlMgr->Free(list);
     return hr;
-  } catch (const std::bad_alloc&) {
-    return E_OUTOFMEMORY;
-  }
+  });
 }
 
 STDMETHODIMP CGravonShellFolderBase::BindToStorage(PCUIDLIST_RELATIVE, IBindCtx*, REFIID, void** result) {
@@ -116,7 +115,7 @@ STDMETHODIMP CGravonShellFolderBase::BindToStorage(PCUIDLIST_RELATIVE, IBindCtx*
 STDMETHODIMP CGravonShellFolderBase::CompareIDs(LPARAM parameter, PCUIDLIST_RELATIVE first,
                                                 PCUIDLIST_RELATIVE second) {
   if (!m_pidlMgr) return 0;
-  return static_cast<HRESULT>(m_pidlMgr->Compare(parameter, first, second));
+  return boundary::Call([&] { return static_cast<HRESULT>(m_pidlMgr->Compare(parameter, first, second)); });
 }
 
 // The caller's mask plays no part, and only the first item is ever validated.
@@ -126,9 +125,13 @@ STDMETHODIMP CGravonShellFolderBase::GetAttributesOf(UINT count, PCUITEMID_CHILD
   *attributes = 0xFFFFFFFF;
   if (count == 0) return S_OK;
   if (!items || !m_pidlMgr) return E_INVALIDARG;
+  return boundary::Call([&] { return AttributesOf(count, items, *attributes); });
+}
+
+HRESULT CGravonShellFolderBase::AttributesOf(UINT count, PCUITEMID_CHILD_ARRAY items, SFGAOF& attributes) {
   for (UINT i = 0; i < count; ++i) {
     LPCITEMIDLIST item = items[i];
-    if ((*attributes & SFGAO_VALIDATE) && !m_pidlMgr->IsValid(item)) return E_FAIL;
+    if ((attributes & SFGAO_VALIDATE) && !m_pidlMgr->IsValid(item)) return E_FAIL;
     SFGAOF own = 0;
     LPCITEMIDLIST last = m_pidlMgr->GetLast(item);
     if (last) {
@@ -138,7 +141,7 @@ STDMETHODIMP CGravonShellFolderBase::GetAttributesOf(UINT count, PCUITEMID_CHILD
         default: break;
       }
     }
-    *attributes &= own;
+    attributes &= own;
   }
   return S_OK;
 }
@@ -146,6 +149,10 @@ STDMETHODIMP CGravonShellFolderBase::GetAttributesOf(UINT count, PCUITEMID_CHILD
 STDMETHODIMP CGravonShellFolderBase::GetDisplayNameOf(PCUITEMID_CHILD item, SHGDNF flags, STRRET* name) {
   if (!name) return E_INVALIDARG;
   if (!IsUsable()) return E_OUTOFMEMORY;
+  return boundary::Call([&] { return DisplayNameOf(item, flags, *name); });
+}
+
+HRESULT CGravonShellFolderBase::DisplayNameOf(PCUITEMID_CHILD item, SHGDNF flags, STRRET& name) {
   wchar_t text[MAX_PATH] = {};
   const DWORD high = flags >> 8;
   const DWORD low = flags & 0xFF;
@@ -170,8 +177,8 @@ STDMETHODIMP CGravonShellFolderBase::GetDisplayNameOf(PCUITEMID_CHILD item, SHGD
   auto* copy = static_cast<wchar_t*>(m_malloc->Alloc(bytes));
   if (!copy) return E_OUTOFMEMORY;
   std::memcpy(copy, text, bytes);
-  name->uType = STRRET_WSTR;
-  name->pOleStr = copy;
+  name.uType = STRRET_WSTR;
+  name.pOleStr = copy;
   return S_OK;
 }
 

@@ -40,6 +40,9 @@ class CGravonShellFolderBase : public com::ComObject<IShellFolder, IPersistFolde
  protected:
   void* FindInterface(REFIID riid) noexcept override;
   void Clear();
+  // The bodies of the slots above that allocate; the slots keep exceptions inside.
+  HRESULT AttributesOf(UINT count, PCUITEMID_CHILD_ARRAY items, SFGAOF& attributes);
+  HRESULT DisplayNameOf(PCUITEMID_CHILD item, SHGDNF flags, STRRET& name);
 
   LPITEMIDLIST m_list = nullptr;
   CGravonShellFolderBase* m_parent = nullptr;

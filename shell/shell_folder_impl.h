@@ -5,6 +5,7 @@
 
 #include <type_traits>
 
+#include "base/boundary.h"
 #include "shell/shell_folder_base.h"
 
 // Stands in for a class the module doesn't have yet: asking for it fails plainly.
@@ -26,31 +27,50 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
   STDMETHODIMP EnumObjects(HWND, SHCONTF flags, IEnumIDList** result) override {
     if (!result) return E_INVALIDARG;
     *result = nullptr;
-    wchar_t path[MAX_PATH];
-    GetFolderPath(path, MAX_PATH, false);
-    auto* list = new (std::nothrow) TEnum();
-    if (!list) return E_OUTOFMEMORY;
-    HRESULT hr = E_OUTOFMEMORY;
-    list->Create(path, flags, &hr);
-    if (FAILED(hr)) return hr;
-    *result = list;
-    return S_OK;
+    return boundary::Call([&] {
+      wchar_t path[MAX_PATH];
+      GetFolderPath(path, MAX_PATH, false);
+      auto* list = new (std::nothrow) TEnum();
+      if (!list) return E_OUTOFMEMORY;
+      HRESULT hr = E_OUTOFMEMORY;
+      list->Create(path, flags, &hr);
+      if (FAILED(hr)) return hr;
+      *result = list;
+      return S_OK;
+    });
   }
 
   STDMETHODIMP BindToObject(PCUIDLIST_RELATIVE list, IBindCtx*, REFIID riid, void** result) override {
     if (!result) return E_INVALIDARG;
     *result = nullptr;
     if (!list || m_pidlMgr->IsFile(list)) return E_INVALIDARG;
-    auto folder = com::Make<TFolder>();
-    if (!folder) return E_OUTOFMEMORY;
-    HRESULT hr = folder->Init(this, list);
-    if (FAILED(hr)) return hr;
-    return folder->QueryInterface(riid, result);
+    return boundary::Call([&] {
+      auto folder = com::Make<TFolder>();
+      if (!folder) return E_OUTOFMEMORY;
+      HRESULT hr = folder->Init(this, list);
+      if (FAILED(hr)) return hr;
+      return folder->QueryInterface(riid, result);
+    });
   }
 
   STDMETHODIMP CreateViewObject(HWND, REFIID riid, void** result) override {
     if (!result) return E_INVALIDARG;
     *result = nullptr;
+    return boundary::Call([&] { return CreateViewObjectOf(riid, result); });
+  }
+
+  // One object for one item, handed the item's full list; no multiple selections here.
+  STDMETHODIMP GetUIObjectOf(HWND, UINT count, PCUITEMID_CHILD_ARRAY items, REFIID riid, UINT*,
+                             void** result) override {
+    if (!result) return E_INVALIDARG;
+    *result = nullptr;
+    if (count != 1) return E_FAIL;
+    if (!items || !items[0]) return E_INVALIDARG;
+    return boundary::Call([&] { return UIObjectOf(items[0], riid, result); });
+  }
+
+ private:
+  HRESULT CreateViewObjectOf(REFIID riid, void** result) {
     if (riid == IID_IShellView) {
       if constexpr (std::is_same_v<TView, CClassNotAvailable>) {
         return CLASS_E_CLASSNOTAVAILABLE;
@@ -69,24 +89,17 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
     return E_NOINTERFACE;
   }
 
-  // One object for one item, handed the item's full list; no multiple selections here.
-  STDMETHODIMP GetUIObjectOf(HWND, UINT count, PCUITEMID_CHILD_ARRAY items, REFIID riid, UINT*,
-                             void** result) override {
-    if (!result) return E_INVALIDARG;
-    *result = nullptr;
-    if (count != 1) return E_FAIL;
-    if (!items || !items[0]) return E_INVALIDARG;
+  HRESULT UIObjectOf(LPCITEMIDLIST item, REFIID riid, void** result) {
     const auto setItem = [](auto& object, LPCITEMIDLIST full) { return object.SetItem(full); };
-    if (riid == IID_IExtractIconW) return MakeItemObject<TExtractIcon>(items[0], riid, result, setItem);
-    if (riid == IID_IQueryInfo) return MakeItemObject<TQueryInfo>(items[0], riid, result, setItem);
+    if (riid == IID_IExtractIconW) return MakeItemObject<TExtractIcon>(item, riid, result, setItem);
+    if (riid == IID_IQueryInfo) return MakeItemObject<TQueryInfo>(item, riid, result, setItem);
     if (riid == IID_IDataObject)
-      return MakeItemObject<TDataObject>(items[0], riid, result,
+      return MakeItemObject<TDataObject>(item, riid, result,
                                          [](auto& object, LPCITEMIDLIST full) { return object.AddItem(full); });
-    if (riid == IID_IDropTarget) return MakeItemObject<TDropTarget>(items[0], riid, result, setItem);
+    if (riid == IID_IDropTarget) return MakeItemObject<TDropTarget>(item, riid, result, setItem);
     return E_NOINTERFACE;
   }
 
- private:
   template <class T, class Attach>
   HRESULT MakeItemObject(LPCITEMIDLIST item, REFIID riid, void** result, Attach attach) {
     if constexpr (std::is_same_v<T, CClassNotAvailable>) {

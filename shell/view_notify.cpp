@@ -1,5 +1,6 @@
 #include "shell/view_notify.h"
 
+#include "base/boundary.h"
 #include "base/module_instance.h"
 
 void BroadcastChange(UINT lastIdType) {
@@ -9,14 +10,16 @@ void BroadcastChange(UINT lastIdType) {
 namespace {
 
 LRESULT CALLBACK NotifyWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
-  if (message == GlobalNotifyMessage) {
-    auto* pair = reinterpret_cast<NotifyWindowPair*>(GetWindowLongPtrW(window, GWLP_USERDATA));
-    if (pair) {
-      SendMessageW(pair->ViewWindow, message, wParam, lParam);
-      return 0;
+  return boundary::CallWindow(window, message, wParam, lParam, [&]() -> LRESULT {
+    if (message == GlobalNotifyMessage) {
+      auto* pair = reinterpret_cast<NotifyWindowPair*>(GetWindowLongPtrW(window, GWLP_USERDATA));
+      if (pair) {
+        SendMessageW(pair->ViewWindow, message, wParam, lParam);
+        return 0;
+      }
     }
-  }
-  return DefWindowProcW(window, message, wParam, lParam);
+    return DefWindowProcW(window, message, wParam, lParam);
+  });
 }
 
 }  // namespace

@@ -12,7 +12,7 @@
 
 void (*PointsBlockFreeHook)(const PointsBlock* block) = nullptr;
 
-void CommResultCallback(int code) {
+void CommResultCallback(int code) noexcept {
   // Runs on the library's thread: touch nothing but the handle and the message number.
   HWND dialog = DownloadDialogWindow;
   if (!dialog) return;

@@ -64,7 +64,7 @@ constexpr int kCommInterrupted = -102;
 
 // Posts DownloadMessage (wParam 0, lParam the code sign-extended) to the open transfer
 // dialog; does nothing when none is open. May run on any thread.
-void CommResultCallback(int code);
+void CommResultCallback(int code) noexcept;
 
 // A result code of ReceiveFile or of the callback as the user's sentence.
 std::wstring CommResultText(int code);

@@ -4,6 +4,7 @@
 #include <new>
 #include <string>
 
+#include "base/boundary.h"
 #include "helpers/win_handles.h"
 #include "server/class_creators.h"
 #include "store/pidl_manager.h"
@@ -75,16 +76,14 @@ STDMETHODIMP CMarlixDLDataObject::GetData(FORMATETC* format, STGMEDIUM* medium) 
   if (!format || !medium) return E_INVALIDARG;
   if (TransferDialogOpen()) return E_INVALIDARG;
   const FORMATETC& f = *format;
-  try {
+  return boundary::Call([&] {
     if (IsGlobalRequest(f, DropEffectFormat())) return GetDropEffect(*medium);
     if (IsGlobalRequest(f, GroupDescriptorFormat())) return GetGroupDescriptor(*medium);
     if (IsStreamRequest(f, FileContentsFormat())) return GetFileContents(f.lindex, *medium);
     if (IsGlobalRequest(f, IdListArrayFormat())) return GetIdListArray(*medium);
     if (IsGlobalRequest(f, StationsFormat())) return GetStations(*medium);
-  } catch (const std::bad_alloc&) {
-    return E_OUTOFMEMORY;
-  }
-  return E_INVALIDARG;
+    return E_INVALIDARG;
+  });
 }
 
 HRESULT CMarlixDLDataObject::GetDropEffect(STGMEDIUM& medium) {

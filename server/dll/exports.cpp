@@ -1,14 +1,21 @@
 #include <windows.h>
 #include <olectl.h>
 
+#include "base/boundary.h"
 #include "server/module_app.h"
 
 STDAPI DllCanUnloadNow() { return TheModuleApp().Server().CanUnloadNow(); }
 
 STDAPI DllGetClassObject(REFCLSID clsid, REFIID riid, LPVOID* ppv) {
-  return TheModuleApp().Server().GetClassObject(clsid, riid, ppv);
+  return boundary::Call([&] { return TheModuleApp().Server().GetClassObject(clsid, riid, ppv); });
 }
 
-STDAPI DllRegisterServer() { return TheModuleApp().Server().RegisterServer(); }
+STDAPI DllRegisterServer() {
+  return boundary::Call([] { return TheModuleApp().Server().RegisterServer(); });
+}
 
-STDAPI DllUnregisterServer() { return TheModuleApp().Server().UnregisterServer(); }
+// Answers S_OK whatever happened, running out of memory included.
+STDAPI DllUnregisterServer() {
+  boundary::CallVoid([] { TheModuleApp().Server().UnregisterServer(); });
+  return S_OK;
+}

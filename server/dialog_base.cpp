@@ -77,56 +77,82 @@ void CDialog::MapMessage(UINT message, std::function<LRESULT(WPARAM, LPARAM)> ha
   messages_.push_back({message, std::move(handler)});
 }
 
-void CDialog::DdxText(bool toControls, int id, std::wstring& value) {
-  HWND control = Item(id);
+void CDialog::DdxText(bool toControls, int id, std::wstring& value) { ddx::Text(window_, toControls, id, value); }
+void CDialog::DdxComboIndex(bool toControls, int id, int& index) { ddx::ComboIndex(window_, toControls, id, index); }
+void CDialog::DdxComboExact(bool toControls, int id, std::wstring& value) {
+  ddx::ComboExact(window_, toControls, id, value);
+}
+void CDialog::DdxComboPrefix(bool toControls, int id, std::wstring& value) {
+  ddx::ComboPrefix(window_, toControls, id, value);
+}
+
+namespace ddx {
+namespace {
+std::wstring ItemText(HWND combo, LRESULT index) {
+  LRESULT length = SendMessageW(combo, CB_GETLBTEXTLEN, static_cast<WPARAM>(index), 0);
+  if (length == CB_ERR) return {};
+  std::wstring text(static_cast<size_t>(length) + 1, L'\0');
+  LRESULT copied = SendMessageW(combo, CB_GETLBTEXT, static_cast<WPARAM>(index), reinterpret_cast<LPARAM>(text.data()));
+  text.resize(copied > 0 ? static_cast<size_t>(copied) : 0);
+  return text;
+}
+
+std::wstring ComboText(HWND combo) {
+  LRESULT selection = SendMessageW(combo, CB_GETCURSEL, 0, 0);
+  return selection == CB_ERR ? WindowText(combo) : ItemText(combo, selection);
+}
+
+// A drop-down list has no edit part to keep a text that no item matches.
+void KeepUnmatchedText(HWND combo, const std::wstring& value) {
+  if ((GetWindowLongW(combo, GWL_STYLE) & 3) != CBS_DROPDOWNLIST) SetWindowTextW(combo, value.c_str());
+}
+}  // namespace
+
+void Text(HWND dialog, bool toControls, int id, std::wstring& value) {
+  HWND control = GetDlgItem(dialog, id);
   if (!control) return;
   if (toControls) SetWindowTextW(control, value.c_str());
   else value = WindowText(control);
 }
 
-void CDialog::DdxComboIndex(bool toControls, int id, int& index) {
-  HWND combo = Item(id);
+void ComboIndex(HWND dialog, bool toControls, int id, int& index) {
+  HWND combo = GetDlgItem(dialog, id);
   if (!combo) return;
   if (toControls) SendMessageW(combo, CB_SETCURSEL, static_cast<WPARAM>(index), 0);
   else index = static_cast<int>(SendMessageW(combo, CB_GETCURSEL, 0, 0));
 }
 
-std::wstring CDialog::ComboText(HWND combo) {
-  LRESULT selection = SendMessageW(combo, CB_GETCURSEL, 0, 0);
-  if (selection == CB_ERR) return WindowText(combo);
-  LRESULT length = SendMessageW(combo, CB_GETLBTEXTLEN, static_cast<WPARAM>(selection), 0);
-  if (length == CB_ERR) return {};
-  std::wstring text(static_cast<size_t>(length) + 1, L'\0');
-  LRESULT copied = SendMessageW(combo, CB_GETLBTEXT, static_cast<WPARAM>(selection),
-                                reinterpret_cast<LPARAM>(text.data()));
-  text.resize(copied > 0 ? static_cast<size_t>(copied) : 0);
-  return text;
-}
-
-void CDialog::DdxComboExact(bool toControls, int id, std::wstring& value) {
-  HWND combo = Item(id);
+void ComboExact(HWND dialog, bool toControls, int id, std::wstring& value) {
+  HWND combo = GetDlgItem(dialog, id);
   if (!combo) return;
   if (!toControls) {
     value = ComboText(combo);
     return;
   }
-  LRESULT found = SendMessageW(combo, CB_FINDSTRINGEXACT, static_cast<WPARAM>(-1),
-                               reinterpret_cast<LPARAM>(value.c_str()));
-  if (found != CB_ERR) SendMessageW(combo, CB_SETCURSEL, static_cast<WPARAM>(found), 0);
-  else SetWindowTextW(combo, value.c_str());  // kept in the edit part of a drop-down
+  // CB_FINDSTRINGEXACT ignores case: walk its matches until one equals the text.
+  LRESULT first = SendMessageW(combo, CB_FINDSTRINGEXACT, static_cast<WPARAM>(-1), reinterpret_cast<LPARAM>(value.c_str()));
+  for (LRESULT found = first; found != CB_ERR;) {
+    if (ItemText(combo, found) == value) {
+      SendMessageW(combo, CB_SETCURSEL, static_cast<WPARAM>(found), 0);
+      return;
+    }
+    found = SendMessageW(combo, CB_FINDSTRINGEXACT, static_cast<WPARAM>(found), reinterpret_cast<LPARAM>(value.c_str()));
+    if (found <= first) break;  // the search wraps around
+  }
+  KeepUnmatchedText(combo, value);
 }
 
-void CDialog::DdxComboPrefix(bool toControls, int id, std::wstring& value) {
-  HWND combo = Item(id);
+void ComboPrefix(HWND dialog, bool toControls, int id, std::wstring& value) {
+  HWND combo = GetDlgItem(dialog, id);
   if (!combo) return;
   if (!toControls) {
     value = ComboText(combo);
     return;
   }
-  LRESULT found = SendMessageW(combo, CB_SELECTSTRING, static_cast<WPARAM>(-1),
-                               reinterpret_cast<LPARAM>(value.c_str()));
-  if (found == CB_ERR) SetWindowTextW(combo, value.c_str());
+  LRESULT found = SendMessageW(combo, CB_SELECTSTRING, static_cast<WPARAM>(-1), reinterpret_cast<LPARAM>(value.c_str()));
+  if (found == CB_ERR) KeepUnmatchedText(combo, value);
 }
+}  // namespace ddx
 
 bool CDialog::Dispatch(UINT message, WPARAM wParam, LPARAM lParam, INT_PTR& result) {
   for (const MessageEntry& entry : messages_) {

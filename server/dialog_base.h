@@ -41,13 +41,10 @@ class CDialog {
   void MapCommand(UINT id, std::function<void()> handler);
   void MapMessage(UINT message, std::function<LRESULT(WPARAM, LPARAM)> handler);
 
-  // Data exchange helpers. Text: edit or static control text.
+  // Data exchange helpers, shared with the property pages (see ddx below).
   void DdxText(bool toControls, int id, std::wstring& value);
-  // Combo box by index of the selection (-1 none).
   void DdxComboIndex(bool toControls, int id, int& index);
-  // Combo box by text: selects the item equal to it (case-insensitive whole string).
   void DdxComboExact(bool toControls, int id, std::wstring& value);
-  // Combo box by text: selects the first item that begins with it.
   void DdxComboPrefix(bool toControls, int id, std::wstring& value);
 
   HWND Item(int id) const noexcept { return GetDlgItem(window_, id); }
@@ -56,7 +53,6 @@ class CDialog {
   static INT_PTR CALLBACK DialogProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
   static INT_PTR Route(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
   bool Dispatch(UINT message, WPARAM wParam, LPARAM lParam, INT_PTR& result);
-  static std::wstring ComboText(HWND combo);
 
   struct MessageEntry {
     UINT message;
@@ -76,3 +72,16 @@ class CDialog {
 
 // The text of a window, any length.
 std::wstring WindowText(HWND window);
+
+// Exchange between the controls of a dialog window and members, for dialogs and property pages.
+namespace ddx {
+// Text: edit or static control text.
+void Text(HWND dialog, bool toControls, int id, std::wstring& value);
+// Combo box by index of the selection (-1 none).
+void ComboIndex(HWND dialog, bool toControls, int id, int& index);
+// Combo box by text: selects the item equal to it, case counting. Reading gives the
+// selected item's text, or the edit text of a combo box that has one.
+void ComboExact(HWND dialog, bool toControls, int id, std::wstring& value);
+// Combo box by text: selects the first item that begins with it (the control's own search).
+void ComboPrefix(HWND dialog, bool toControls, int id, std::wstring& value);
+}  // namespace ddx

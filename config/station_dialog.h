@@ -1,0 +1,93 @@
+// The level property sheet: a General and an Advanced page over one CStationRecord,
+// through which a user creates a digital level or changes one. The sheet checks the
+// name and writes the record to the store itself.
+#pragma once
+#include <windows.h>
+#include <string>
+#include <vector>
+
+#include "server/property_sheet.h"
+#include "store/station_record.h"
+
+// Appends the machine's serial port names (the data of HKLM\HARDWARE\DEVICEMAP\SERIALCOMM)
+// and gives their number. The first value that is not REG_SZ, or too long, ends the list.
+int EnumSerialPorts(std::vector<std::wstring>& ports);
+
+// The port number in a port name: the digits from the first digit on (COM12 gives 12,
+// A2COM7 gives 2); 0 for a name without digits.
+int PortNumberOf(const std::wstring& portText);
+
+class CStationGeneralPage : public CPropertyPage {
+ public:
+  CStationGeneralPage(int newLevel, CStationRecord* record) noexcept;
+
+  int NewLevel;
+  CStationRecord* Record;  // not owned
+  std::wstring NameText;
+  std::wstring NoteText;
+  std::wstring PortText;
+  std::wstring ModelText;
+  CComboBox PortList;
+  CComboBox ModelList;
+  int LevelAdded = 0;  // set by the sheet after an add; nothing reads it
+
+ protected:
+  void DoDataExchange(bool toControls) override;
+  BOOL OnInitDialog() override;
+
+ private:
+  void OnChange();
+  bool initializing_ = false;
+};
+
+class CStationAdvancedPage : public CPropertyPage {
+ public:
+  CStationAdvancedPage(int newLevel, CStationRecord* record) noexcept;
+
+  int NewLevel;
+  CStationRecord* Record;  // not owned
+  std::wstring ParityText;
+  std::wstring BaudText;
+  std::wstring DataBitsText;
+  std::wstring StopBitsText;
+  std::wstring FlowText;
+  std::wstring CheckSumText;
+  CComboBox BaudList;
+  CComboBox ParityList;
+  CComboBox DataBitsList;
+  CComboBox StopBitsList;
+  CComboBox FlowList;
+  CComboBox CheckSumList;
+
+ protected:
+  void DoDataExchange(bool toControls) override;
+  BOOL OnInitDialog() override;
+
+ private:
+  void OnChange();
+  bool initializing_ = false;
+};
+
+class CStationDialog : public CPropertySheet {
+ public:
+  // The record is the caller's and must outlive the sheet; `parent` may be null.
+  CStationDialog(HWND parent, CStationRecord& record, bool newLevel);
+
+  // Non-zero when the record may be saved; otherwise it has told the user why.
+  int ValidateStation(CStationRecord& record);
+  // Adds the level (new-level mode) or updates it under the name it had on entry.
+  HRESULT SaveStation();
+
+  BYTE NewLevel;
+  std::wstring NameOnEntry;  // never refreshed, not even by a rename through Apply
+  CStationRecord* Record;    // not owned
+  CStationGeneralPage GeneralPage;
+  CStationAdvancedPage AdvancedPage;
+
+ protected:
+  BOOL OnCommand(WPARAM wParam, LPARAM lParam) override;
+  BOOL OnInitDialog() override;
+
+ private:
+  void ShowError(const std::wstring& text);
+};

@@ -1,0 +1,286 @@
+#include <gtest/gtest.h>
+
+#include "base/module_instance.h"
+#include "base/resource_ids.h"
+#include "config/sheet_driver.h"
+#include "store/string_table.h"
+
+using namespace sheet;
+using Strings = std::vector<std::wstring>;
+
+namespace {
+
+const std::wstring kErrorCaption = L"Add New Digital Level";
+
+struct StationSheet : testing::Test {
+  void SetUp() override { SetSerialPorts({{L"\\Device\\Serial2", L"COM2"}, {L"\\Device\\Serial10", L"COM10"},
+                                          {L"\\Device\\Serial1", L"COM1"}, {L"\\Device\\VSer", L"XYZ"}}); }
+  static CStationRecord Stored(const std::wstring& name, const std::wstring& note = L"") {
+    CStationRecord level;
+    level.Name = name;
+    level.Manufacturer = note;
+    EXPECT_EQ(AddStation(level), S_OK);
+    return level;
+  }
+  static CStationRecord Level(const std::wstring& name) {  // as the store hands it out
+    CStationRecord level;
+    level.Name = name;
+    EXPECT_EQ(FindStation(level), S_OK);
+    return level;
+  }
+  RegistrySandbox sandbox{{HKEY_CURRENT_USER, HKEY_LOCAL_MACHINE}};
+};
+
+// One control of a dialog template: id, class atom (0x80 button .. 0x85 combo box), rectangle, style.
+struct TemplateItem {
+  int id, atom, x, y, cx, cy;
+  DWORD style;
+  bool operator==(const TemplateItem&) const = default;
+};
+void PrintTo(const TemplateItem& i, std::ostream* os) {
+  *os << i.id << " atom " << std::hex << i.atom << std::dec << " (" << i.x << "," << i.y << "," << i.cx << "," << i.cy
+      << ") style 0x" << std::hex << i.style;
+}
+
+// Reads a classic DIALOG resource: title, size, font and the controls in tab order.
+struct Template {
+  std::wstring title, font;
+  int cx = 0, cy = 0, points = 0;
+  std::vector<TemplateItem> items;
+};
+Template ReadTemplate(UINT id) {
+  HRSRC found = FindResourceW(ModuleInstance(), MAKEINTRESOURCEW(id), MAKEINTRESOURCEW(5));
+  auto* words = static_cast<const WORD*>(LockResource(LoadResource(ModuleInstance(), found)));
+  auto* head = reinterpret_cast<const DLGTEMPLATE*>(words);
+  Template t{.cx = head->cx, .cy = head->cy};
+  const WORD* p = words + sizeof(DLGTEMPLATE) / 2;
+  auto text = [&p] { std::wstring s(reinterpret_cast<const wchar_t*>(p)); p += s.size() + 1; return s; };
+  auto skip = [&p, &text] { if (*p == 0xFFFF) p += 2; else text(); };
+  skip(), skip();  // menu, class
+  t.title = text();
+  t.points = *p++;
+  t.font = text();
+  for (int i = 0; i < head->cdit; ++i) {
+    p = reinterpret_cast<const WORD*>((reinterpret_cast<ULONG_PTR>(p) + 3) & ~ULONG_PTR(3));
+    auto* item = reinterpret_cast<const DLGITEMTEMPLATE*>(p);
+    p += sizeof(DLGITEMTEMPLATE) / 2;
+    int atom = p[0] == 0xFFFF ? p[1] : -1;
+    skip(), skip();  // class, text
+    p += 1 + *p / 2;  // creation data
+    t.items.push_back({item->id, atom, item->x, item->y, item->cx, item->cy, item->style & ~DWORD(WS_CHILD | WS_VISIBLE | WS_GROUP)});
+  }
+  return t;
+}
+
+}  // namespace
+
+TEST(StationTemplates, LayoutIdsTabOrderAndStyles) {
+  const DWORD edit = ES_AUTOHSCROLL | WS_BORDER | WS_TABSTOP, list = CBS_DROPDOWNLIST | WS_VSCROLL | WS_TABSTOP,
+              sorted = list | CBS_SORT;
+  Template general = ReadTemplate(IDD_STATION_GENERAL), advanced = ReadTemplate(IDD_STATION_ADVANCED);
+  EXPECT_EQ(general.title, L"General");
+  EXPECT_EQ(advanced.title, L"Advanced");
+  for (const Template& t : {general, advanced}) EXPECT_EQ(t.font + L" " + std::to_wstring(t.points), L"MS Sans Serif 8");
+  EXPECT_EQ(std::make_pair(general.cx, general.cy), std::make_pair(192, 126));
+  EXPECT_EQ(std::make_pair(advanced.cx, advanced.cy), std::make_pair(192, 127));
+  EXPECT_EQ(general.items, (std::vector<TemplateItem>{
+                               {310, 0x82, 5, 5, 45, 10, 0}, {203, 0x81, 60, 5, 125, 15, edit},
+                               {311, 0x82, 5, 35, 45, 10, 0}, {204, 0x81, 60, 25, 125, 35, edit},
+                               {312, 0x82, 5, 65, 45, 10, 0}, {205, 0x85, 60, 65, 125, 45, sorted},
+                               {313, 0x82, 5, 85, 50, 10, 0}, {206, 0x85, 60, 85, 125, 45, sorted}}));
+  EXPECT_EQ(advanced.items, (std::vector<TemplateItem>{
+                                {314, 0x82, 5, 5, 45, 10, 0}, {208, 0x85, 60, 5, 125, 45, list},
+                                {316, 0x82, 5, 25, 45, 10, 0}, {210, 0x85, 60, 25, 125, 45, list},
+                                {315, 0x82, 5, 45, 45, 10, 0}, {209, 0x85, 60, 45, 125, 45, list},
+                                {317, 0x82, 5, 65, 45, 10, 0}, {211, 0x85, 60, 65, 125, 45, list},
+                                {322, 0x82, 5, 85, 45, 10, 0}, {219, 0x85, 60, 85, 125, 45, list},
+                                {321, 0x82, 5, 105, 45, 10, 0}, {218, 0x85, 60, 105, 125, 45, list}}));
+}
+
+TEST(SerialPorts, PortNumberFromTheFirstDigitOn) {
+  EXPECT_EQ(PortNumberOf(L"COM12"), 12);
+  EXPECT_EQ(PortNumberOf(L"A2COM7"), 2);
+  EXPECT_EQ(PortNumberOf(L"USB2COM5"), 2);
+  EXPECT_EQ(PortNumberOf(L"XYZ"), 0);
+  EXPECT_EQ(PortNumberOf(L""), 0);
+}
+
+TEST_F(StationSheet, SerialPortListEndsAtTheFirstValueItCannotTake) {
+  const std::wstring path = L"HARDWARE\\DEVICEMAP\\SERIALCOMM", longest(63, L'P');
+  auto ports = [] { Strings found; int n = EnumSerialPorts(found); EXPECT_EQ(n, int(found.size())); return found; };
+  SetSerialPorts({});
+  EXPECT_EQ(ports(), Strings{}) << "no key";
+  SetSerialPorts({{L"a", L"COM3"}, {L"b", longest}});
+  EXPECT_EQ(ports(), (Strings{L"COM3", longest})) << "the data, not the names; 128 bytes fit";
+  RegWriteDword(HKEY_LOCAL_MACHINE, path, L"c", 4);
+  RegWriteString(HKEY_LOCAL_MACHINE, path, L"d", L"COM4");
+  EXPECT_EQ(ports(), (Strings{L"COM3", longest})) << "a number ends the list";
+  SetSerialPorts({{L"a", L"COM3"}, {L"b", longest + L"Q"}, {L"c", L"COM4"}});
+  EXPECT_EQ(ports(), Strings{L"COM3"}) << "a datum too long for 128 bytes";
+  SetSerialPorts({{L"a", L"COM3"}, {L"b" + std::wstring(63, L'n'), L"COM5"}, {L"c", L"COM4"}});
+  EXPECT_EQ(ports(), Strings{L"COM3"}) << "a name too long for 64 characters";
+}
+
+TEST_F(StationSheet, NewLevelShowsItsTextsAndListsAndAddsWithEveryCodeMapped) {
+  CStationRecord level;  // the defaults a new level starts from
+  EXPECT_EQ(RunSheet(level, true, [](HWND sheet) {
+    EXPECT_EQ(Text(sheet), L"Create Digital Level");
+    HWND tabs = reinterpret_cast<HWND>(SendMessageW(sheet, PSM_GETTABCONTROL, 0, 0));
+    for (auto [tab, text] : {std::pair{0, L"General"}, {1, L"Advanced"}}) {
+      wchar_t shown[64] = {};
+      TCITEMW item{.mask = TCIF_TEXT, .pszText = shown, .cchTextMax = 64};
+      SendMessageW(tabs, TCM_GETITEMW, tab, reinterpret_cast<LPARAM>(&item));
+      EXPECT_STREQ(shown, text);
+    }
+    HWND general = Page(sheet, 0);
+    EXPECT_EQ(Page(sheet, 1), nullptr) << "the Advanced page is made when first shown";
+    for (auto [id, text] : {std::pair{310, L"Name:"}, {311, L"Note:"}, {312, L"Port:"}, {313, L"Model:"}})
+      EXPECT_EQ(Text(general, id), text);
+    EXPECT_EQ(Entries(general, 205), (Strings{L"COM1", L"COM10", L"COM2", L"XYZ"}));
+    EXPECT_EQ(Entries(general, 206), (Strings{L"HRA20", L"HRA40", L"HRB1X"}));
+    EXPECT_EQ(Selected(general, 205), L"COM1");
+    EXPECT_EQ(Selected(general, 206), L"HRA20");
+    Type(general, 203, L"North");
+    Type(general, 204, L"tripod 4");
+    Pick(general, 205, L"COM10");
+    Pick(general, 206, L"HRB1X");
+    EXPECT_FALSE(ApplyEnabled(sheet)) << "a new level has no Apply";
+
+    ShowTab(sheet, 1);
+    HWND advanced = Page(sheet, 1);
+    ASSERT_NE(advanced, nullptr);
+    for (auto [id, text] : {std::pair{314, L"Baudrate:"}, {315, L"Parity:"}, {316, L"Data bits:"},
+                            {317, L"Stop bits:"}, {321, L"Flow control:"}, {322, L"Checksum:"}})
+      EXPECT_EQ(Text(advanced, id), text);
+    EXPECT_EQ(Entries(advanced, 208), (Strings{L"300", L"600", L"1200", L"2400", L"4800", L"9600", L"19200", L"38400",
+                                               L"57600", L"115200"}));
+    EXPECT_EQ(Entries(advanced, 209), (Strings{L"None", L"Odd", L"Even"}));
+    EXPECT_EQ(Entries(advanced, 210), (Strings{L"7", L"8"}));
+    EXPECT_EQ(Entries(advanced, 211), (Strings{L"1", L"1.5", L"2"}));
+    EXPECT_EQ(Entries(advanced, 218), (Strings{L"None", L"Xon/Xoff"}));
+    EXPECT_EQ(Entries(advanced, 219), (Strings{L"Not set", L"Set"}));
+    Strings shown;
+    for (int id : {208, 209, 210, 211, 218, 219}) shown.push_back(Selected(advanced, id));
+    EXPECT_EQ(shown, (Strings{L"9600", L"None", L"8", L"1", L"None", L"Set"}));
+    Pick(advanced, 208, L"115200");
+    Pick(advanced, 209, L"Even");
+    Pick(advanced, 210, L"7");
+    Pick(advanced, 211, L"1.5");
+    Pick(advanced, 218, L"Xon/Xoff");
+    Pick(advanced, 219, L"Not set");
+    EXPECT_FALSE(ApplyEnabled(sheet));
+    Press(sheet, IDOK);
+  }), IDOK);
+  EXPECT_EQ(StoredLevels(), Strings{L"North|10|115200|15|1|7|1|0|tripod 4|HRB1X"});
+}
+
+TEST_F(StationSheet, RefusedNamesKeepTheSheetOpenAndTheStoreUntouched) {
+  Stored(L"Level");
+  const std::wstring name259(259, L'n');
+  Stored(name259);
+  const Strings before = StoredLevels();
+  CStationRecord level;
+  EXPECT_EQ(RunSheet(level, true, [&](HWND sheet) {
+    HWND general = Page(sheet, 0);
+    const std::wstring badChars = L"Digital Level's name can not contain folowing symbols:\n\t\t\\*/";
+    const std::pair<std::wstring, std::wstring> cases[] = {
+        {L"", L"Please enter valid device name!"},
+        {L"A/B", badChars}, {L"A\\B", badChars}, {L"A*B", badChars}, {L"A\"B", badChars},
+        {L"Level", L"The digital level 'Level' already exists"},
+        {name259, (L"The digital level '" + name259 + L"' already exists").substr(0, 259)}};
+    for (const auto& [name, message] : cases) {
+      Type(general, 203, name);
+      Press(sheet, IDOK);
+      EXPECT_EQ(ReadBox(sheet, kErrorCaption), message) << testing::PrintToString(name);
+      EXPECT_EQ(Text(general, 203), name) << "what the user typed stays";
+      EXPECT_EQ(StoredLevels(), before);
+    }
+    Type(general, 203, L"level");
+    Press(sheet, IDOK);
+  }), IDOK);
+  EXPECT_EQ(StoredLevels().size(), 3u);
+  EXPECT_EQ(Level(L"level").Name, L"level") << "case counts";
+}
+
+TEST_F(StationSheet, NamesTooLongForTheStoreAreNeverDuplicates) {
+  const std::wstring name300(300, L'x');
+  Stored(name300);
+  CStationRecord level;
+  level.Name = name300;
+  CStationDialog dialog(nullptr, level, true);
+  EXPECT_EQ(dialog.ValidateStation(level), 1) << "a name the store cannot read back matches nothing";
+}
+
+TEST_F(StationSheet, EditingWithoutTheAdvancedTabStoresItsFieldsExactlyAsRead) {
+  CStationRecord odd = Stored(L"Odd codes", L"old");
+  odd.BaudRate = 7, odd.StopBits = 0, odd.Parity = 7, odd.DataBits = 5, odd.Flow = 3, odd.CheckSum = 9;
+  ASSERT_EQ(UpdateStation(L"Odd codes", odd), S_OK);
+  CStationRecord level = Level(L"Odd codes");
+  SetSerialPorts({});  // no SERIALCOMM key: no ports, and the port stored is 0
+  EXPECT_EQ(RunSheet(level, false, [](HWND sheet) {
+    EXPECT_EQ(Text(sheet), L"Digital Level properties");
+    EXPECT_EQ(Entries(Page(sheet, 0), 205), Strings{});
+    EXPECT_FALSE(ApplyEnabled(sheet)) << "nothing changed yet";
+    Type(Page(sheet, 0), 204, L"new");
+    EXPECT_TRUE(ApplyEnabled(sheet));
+    Press(sheet, IDOK);
+  }), IDOK);
+  EXPECT_EQ(StoredLevels(), Strings{L"Odd codes|0|7|0|7|5|3|9|new|HRA20"});
+}
+
+TEST_F(StationSheet, UnknownStoredValuesShowAsTheTablesSayAndStoreBackSo) {
+  SetSerialPorts({{L"a", L"COM10"}, {L"b", L"XYZ"}});
+  CStationRecord stored = Stored(L"Twelve");
+  stored.Port = 1, stored.Model = L"HRA2", stored.BaudRate = 12, stored.StopBits = 0, stored.Parity = 7;
+  ASSERT_EQ(UpdateStation(L"Twelve", stored), S_OK);
+  CStationRecord level = Level(L"Twelve");
+  EXPECT_EQ(RunSheet(level, false, [](HWND sheet) {
+    EXPECT_EQ(Selected(Page(sheet, 0), 205), L"<none>") << "COM1 is no port here, though COM10 begins with it";
+    EXPECT_EQ(Selected(Page(sheet, 0), 206), L"<none>") << "HRA2 is no model";
+    ShowTab(sheet, 1);
+    Strings shown;
+    for (int id : {208, 209, 211}) shown.push_back(Selected(Page(sheet, 1), id));
+    EXPECT_EQ(shown, (Strings{L"1200", L"None", L"1"})) << "12 begins 1200";
+    Press(sheet, IDOK);
+  }), IDOK);
+  EXPECT_EQ(StoredLevels(), Strings{L"Twelve|0|1200|1|0|8|0|1||"});
+
+  level = Level(L"Twelve");
+  level.BaudRate = 7, level.StopBits = 15, level.Parity = 2;
+  ASSERT_EQ(UpdateStation(L"Twelve", level), S_OK);
+  EXPECT_EQ(RunSheet(level, false, [](HWND sheet) {
+    Pick(Page(sheet, 0), 205, L"XYZ");
+    ShowTab(sheet, 1);
+    EXPECT_EQ(Selected(Page(sheet, 1), 208), L"<none>") << "no entry begins with 7";
+    EXPECT_EQ(Selected(Page(sheet, 1), 209), L"Odd");
+    EXPECT_EQ(Selected(Page(sheet, 1), 211), L"1.5");
+    Press(sheet, IDOK);
+  }), IDOK);
+  EXPECT_EQ(StoredLevels(), Strings{L"Twelve|0|0|15|2|8|0|1||"});
+}
+
+TEST_F(StationSheet, RenameByApplyThenOkLosesTheSecondSaveWithoutAWord) {
+  Stored(L"A", L"first");
+  CStationRecord level = Level(L"A");
+  EXPECT_EQ(RunSheet(level, false, [](HWND sheet) {
+    Type(Page(sheet, 0), 203, L"B");
+    Press(sheet, 12321);
+    EXPECT_TRUE(WaitFor([] { return StoredLevels() == Strings{L"B|1|9600|1|0|8|0|1|first|HRA20"}; }));
+    Type(Page(sheet, 0), 204, L"second");
+    Press(sheet, IDOK);
+  }), IDOK);
+  EXPECT_EQ(StoredLevels(), Strings{L"B|1|9600|1|0|8|0|1|first|HRA20"}) << "the OK looked for A";
+}
+
+TEST_F(StationSheet, CancelStoresNothingAndEndsWithCancel) {
+  Stored(L"Kept", L"note");
+  CStationRecord level = Level(L"Kept");
+  EXPECT_EQ(RunSheet(level, false, [](HWND sheet) {
+    Type(Page(sheet, 0), 204, L"changed");
+    Press(sheet, IDCANCEL);
+  }), IDCANCEL);
+  EXPECT_EQ(StoredLevels(), Strings{L"Kept|1|9600|1|0|8|0|1|note|HRA20"});
+}
+
+// Run by scripts/sheet-screenshots.
+TEST_F(StationSheet, DISABLED_Screenshots) { TakeScreenshots(L"sheet-en"); }

@@ -25,20 +25,6 @@ int CComboBox::AddString(const std::wstring& text) const {
   return static_cast<int>(SendMessageW(window_, CB_ADDSTRING, 0, reinterpret_cast<LPARAM>(text.c_str())));
 }
 
-int CComboBox::GetCount() const { return static_cast<int>(SendMessageW(window_, CB_GETCOUNT, 0, 0)); }
-
-int CComboBox::GetCurSel() const { return static_cast<int>(SendMessageW(window_, CB_GETCURSEL, 0, 0)); }
-
-std::wstring CComboBox::GetLBText(int index) const {
-  LRESULT length = SendMessageW(window_, CB_GETLBTEXTLEN, static_cast<WPARAM>(index), 0);
-  if (length == CB_ERR) return {};
-  std::wstring text(static_cast<size_t>(length) + 1, L'\0');
-  LRESULT copied =
-      SendMessageW(window_, CB_GETLBTEXT, static_cast<WPARAM>(index), reinterpret_cast<LPARAM>(text.data()));
-  text.resize(copied > 0 ? static_cast<size_t>(copied) : 0);
-  return text;
-}
-
 bool CPropertyPage::UpdateData(bool toControls) {
   if (!window_) return false;
   DoDataExchange(toControls);

@@ -15,9 +15,6 @@ class CComboBox {
   HWND Handle() const noexcept { return window_; }
   // Index of the new entry, or CB_ERR.
   int AddString(const std::wstring& text) const;
-  int GetCount() const;
-  int GetCurSel() const;
-  std::wstring GetLBText(int index) const;
 
  private:
   HWND window_ = nullptr;

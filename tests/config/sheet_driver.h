@@ -45,6 +45,13 @@ inline HWND Page(HWND sheet, int index) {
 inline void ShowTab(HWND sheet, int index) { SendMessageW(sheet, PSM_SETCURSEL, static_cast<WPARAM>(index), 0); }
 inline void Press(HWND sheet, int id) { PostMessageW(GetDlgItem(sheet, id), BM_CLICK, 0, 0); }
 inline bool ApplyEnabled(HWND sheet) { return IsWindowEnabled(GetDlgItem(sheet, 12321)) != FALSE; }
+inline std::wstring TabText(HWND sheet, int index) {
+  wchar_t text[64] = {};
+  TCITEMW item{.mask = TCIF_TEXT, .pszText = text, .cchTextMax = 64};
+  SendMessageW(reinterpret_cast<HWND>(SendMessageW(sheet, PSM_GETTABCONTROL, 0, 0)), TCM_GETITEMW, index,
+               reinterpret_cast<LPARAM>(&item));
+  return text;
+}
 
 // Replaces the edit's text key by key; an empty text is a backspace over everything.
 inline void Type(HWND page, int id, const std::wstring& text) {

@@ -1,5 +1,6 @@
 #include "server/property_sheet.h"
 
+#include "base/boundary.h"
 #include "base/module_instance.h"
 #include "server/dialog_base.h"
 
@@ -8,16 +9,6 @@ namespace {
 // The sheet whose PropertySheetW call is running on this thread: the callback has no
 // parameter of ours, and modal sheets nest only through their own message loops.
 thread_local CPropertySheet* constructingSheet = nullptr;
-
-// No exception may cross back into the platform's window code.
-template <class Result, class Body>
-Result CallGuarded(Result onFailure, Body&& body) noexcept {
-  try {
-    return body();
-  } catch (...) {
-    return onFailure;
-  }
-}
 
 }  // namespace
 
@@ -49,7 +40,7 @@ void CPropertyPage::MapNotification(int id, UINT code, std::function<void()> han
 }
 
 INT_PTR CALLBACK CPropertyPage::PageProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
-  return CallGuarded<INT_PTR>(FALSE, [&]() -> INT_PTR {
+  return boundary::CallOr<INT_PTR>(FALSE, [&]() -> INT_PTR {
     CPropertyPage* self;
     if (message == WM_INITDIALOG) {
       // The platform hands over its copy of the page description; ours rides in its lParam.
@@ -120,7 +111,7 @@ INT_PTR CPropertySheet::DoModal() {
 }
 
 int CALLBACK CPropertySheet::SheetCallback(HWND window, UINT message, LPARAM) {
-  return CallGuarded(0, [&] {
+  return boundary::CallOr(0, [&] {
     CPropertySheet* self = constructingSheet;
     if (message != PSCB_INITIALIZED || !self || self->window_) return 0;
     constructingSheet = nullptr;  // a sheet opened from inside this one finds its own
@@ -137,7 +128,7 @@ LRESULT CALLBACK CPropertySheet::SheetProc(HWND window, UINT message, WPARAM wPa
   auto* self = static_cast<CPropertySheet*>(GetPropW(window, L"MarlixPropertySheet"));
   if (!self) return DefWindowProcW(window, message, wParam, lParam);  // never: the property lives as long
   WNDPROC platform = self->platformProc_;
-  return CallGuarded<LRESULT>(0, [&]() -> LRESULT {
+  return boundary::CallOr<LRESULT>(0, [&]() -> LRESULT {
     switch (message) {
       case WM_COMMAND:
         self->OnCommand(wParam, lParam);

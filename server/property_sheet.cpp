@@ -43,7 +43,7 @@ INT_PTR CALLBACK CPropertyPage::PageProc(HWND window, UINT message, WPARAM wPara
   return boundary::CallOr<INT_PTR>(FALSE, [&]() -> INT_PTR {
     CPropertyPage* self;
     if (message == WM_INITDIALOG) {
-      // The platform hands over its copy of the page description; ours rides in its lParam.
+      // The platform hands over its copy of our PROPSHEETPAGEW; the page rides in its lParam.
       self = reinterpret_cast<CPropertyPage*>(reinterpret_cast<const PROPSHEETPAGEW*>(lParam)->lParam);
       SetWindowLongPtrW(window, DWLP_USER, reinterpret_cast<LONG_PTR>(self));
       self->window_ = window;
@@ -78,16 +78,16 @@ CPropertySheet::CPropertySheet(UINT captionId, HWND parent, UINT startPage) noex
 void CPropertySheet::AddPage(CPropertyPage* page) { pages_.push_back(page); }
 
 INT_PTR CPropertySheet::DoModal() {
-  std::vector<PROPSHEETPAGEW> descriptions;
+  std::vector<PROPSHEETPAGEW> pageInfos;
   for (CPropertyPage* page : pages_) {
-    PROPSHEETPAGEW description{};
-    description.dwSize = sizeof description;
-    description.dwFlags = PSP_DEFAULT;
-    description.hInstance = ModuleInstance();
-    description.pszTemplate = MAKEINTRESOURCEW(page->templateId_);
-    description.pfnDlgProc = CPropertyPage::PageProc;
-    description.lParam = reinterpret_cast<LPARAM>(page);
-    descriptions.push_back(description);
+    PROPSHEETPAGEW info{};
+    info.dwSize = sizeof info;
+    info.dwFlags = PSP_DEFAULT;
+    info.hInstance = ModuleInstance();
+    info.pszTemplate = MAKEINTRESOURCEW(page->templateId_);
+    info.pfnDlgProc = CPropertyPage::PageProc;
+    info.lParam = reinterpret_cast<LPARAM>(page);
+    pageInfos.push_back(info);
   }
   PROPSHEETHEADERW header{};
   header.dwSize = sizeof header;
@@ -95,9 +95,9 @@ INT_PTR CPropertySheet::DoModal() {
   header.hwndParent = parent_;
   header.hInstance = ModuleInstance();
   header.pszCaption = MAKEINTRESOURCEW(captionId_);
-  header.nPages = static_cast<UINT>(descriptions.size());
+  header.nPages = static_cast<UINT>(pageInfos.size());
   header.nStartPage = startPage_;
-  header.ppsp = descriptions.data();
+  header.ppsp = pageInfos.data();
   header.pfnCallback = SheetCallback;
 
   endedWithOk_ = false;

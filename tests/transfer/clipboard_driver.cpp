@@ -4,6 +4,7 @@
 #include <windows.h>
 #include <ole2.h>
 #include <process.h>
+#include <shellapi.h>
 
 #include <cstdio>
 #include <cwchar>
@@ -60,7 +61,9 @@ int Owner(const wchar_t* receiver) {
 
 }  // namespace
 
-int wmain(int argc, wchar_t** argv) {
+int main() {
+  int argc = 0;
+  wchar_t** argv = CommandLineToArgvW(GetCommandLineW(), &argc);
   if (argc < 2 || FAILED(OleInitialize(nullptr))) return 3;
   const int rc = Owner(argv[1]);
   OleUninitialize();

@@ -19,7 +19,7 @@ add_dependencies(marlix_core marlix_typelib)
 
 # Files that module.rc pulls in without #include, so that a change recompiles it.
 file(GLOB MARLIX_MODULE_RC_DEPENDS CONFIGURE_DEPENDS ${CMAKE_SOURCE_DIR}/server/*.rgs ${CMAKE_SOURCE_DIR}/base/resource_ids.h
-     ${CMAKE_SOURCE_DIR}/server/*.rc)
+     ${CMAKE_SOURCE_DIR}/server/*.rc ${CMAKE_SOURCE_DIR}/server/clip/*.avi)
 list(APPEND MARLIX_MODULE_RC_DEPENDS ${MARLIX_TYPELIB})
 
 # Source properties are per directory: call this where a target compiles module.rc.

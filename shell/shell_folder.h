@@ -8,12 +8,13 @@
 #include "shell/extract_icon.h"
 #include "shell/query_info.h"
 #include "shell/shell_folder_impl.h"
+#include "shell/shell_view.h"
 #include "transfer/data_object.h"
 #include "transfer/drop_target.h"
 
 // The classes the folder hands out that live elsewhere; each becomes its real class
 // here once it is in the module.
-using MarlixDLShellViewClass = CClassNotAvailable;   // CMarlixDLShellView
+using MarlixDLShellViewClass = CMarlixDLShellView;
 using MarlixDLDataObjectClass = CMarlixDLDataObject;
 using MarlixDLDropTargetClass = CMarlixDLDropTarget;
 

@@ -77,7 +77,8 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
       } else {
         auto view = com::Make<TView>();
         if (!view) return E_OUTOFMEMORY;
-        view->Init(static_cast<IShellFolder*>(this), m_list);
+        HRESULT hr = view->Init(static_cast<IShellFolder*>(this), m_list);
+        if (FAILED(hr)) return hr;
         return view->QueryInterface(riid, result);
       }
     }

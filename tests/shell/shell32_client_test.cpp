@@ -3,6 +3,9 @@
 
 #include <gtest/gtest.h>
 #include <shellapi.h>
+#include <commctrl.h>
+
+#include <functional>
 
 #include "support/registry_sandbox.h"
 
@@ -82,6 +85,87 @@ TEST(Shell32Client, ReachesTheFolderUnderMyComputerWalksItAndShowsItsItems) {
   win::UniqueIcon shown(large), own(static_cast<HICON>(
       LoadImageW(GetModuleHandleW(L"MarlixDLShellExt.dll"), MAKEINTRESOURCEW(101), IMAGE_ICON, size, size, 0)));
   EXPECT_LT(Difference(shown.Get(), own.Get()), 0.1) << "the level's picture";
+}
+
+bool PumpUntil(const std::function<bool()>& done, DWORD milliseconds = 10000) {
+  DWORD start = GetTickCount();
+  while (!done()) {
+    if (GetTickCount() - start > milliseconds) return false;
+    MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT);
+    MSG msg;
+    while (PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE)) DispatchMessageW(&msg);
+  }
+  return true;
+}
+
+// The list of the browser's current view, once its thread has filled it.
+HWND CurrentList(IExplorerBrowser* browser) {
+  com::ComPtr<IShellView> view;
+  HWND window = nullptr;
+  if (FAILED(browser->GetCurrentView(IID_IShellView, view.PutVoid())) || FAILED(view->GetWindow(&window))) return nullptr;
+  HWND list = GetDlgItem(window, 2000);
+  EXPECT_TRUE(PumpUntil([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); })) << "filled";
+  return list;
+}
+
+std::vector<std::wstring> Rows(HWND list) {
+  std::vector<std::wstring> rows;
+  for (int i = 0; i < ListView_GetItemCount(list); ++i) {
+    wchar_t text[MAX_PATH] = {};
+    ListView_GetItemText(list, i, 0, text, MAX_PATH);
+    rows.push_back(text);
+  }
+  return rows;
+}
+
+const wchar_t kFolderPath[] = L"::{20D04FE0-3AEA-1069-A2D8-08002B30309D}\\::{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}";
+
+// Wine's ExplorerBrowser hosts the view as Explorer's window does: the browser makes
+// the view, the view's thread fills it, and activating a level moves the browser.
+TEST(ExplorerBrowserClient, ShowsTheLevelsAndMovesIntoALevelWhenItIsActivated) {
+  RegistrySandbox sandbox;
+  SeedLevel(0, L"South Site");
+  SeedLevel(1, L"North Site");
+  HWND frame = CreateWindowExW(0, L"STATIC", nullptr, WS_OVERLAPPEDWINDOW, 0, 0, 640, 480, nullptr, nullptr,
+                               nullptr, nullptr);
+  com::ComPtr<IExplorerBrowser> browser;
+  ASSERT_EQ(CoCreateInstance(CLSID_ExplorerBrowser, nullptr, CLSCTX_INPROC_SERVER, IID_IExplorerBrowser,
+                             browser.PutVoid()), S_OK);
+  RECT rect{0, 0, 600, 400};
+  FOLDERSETTINGS settings{FVM_DETAILS, 0};
+  ASSERT_EQ(browser->Initialize(frame, &rect, &settings), S_OK);
+  UniqueList folder;
+  ASSERT_EQ(SHParseDisplayName(kFolderPath, nullptr, folder.Put(), 0, nullptr), S_OK);
+  ASSERT_EQ(browser->BrowseToIDList(folder.Get(), SBSP_ABSOLUTE), S_OK);
+
+  HWND list = CurrentList(browser.Get());
+  ASSERT_TRUE(list);
+  EXPECT_EQ(Rows(list), (std::vector<std::wstring>{L"Add New Digital Level", L"North Site", L"South Site"}));
+  EXPECT_EQ(static_cast<DWORD>(GetWindowLongW(list, GWL_STYLE)), 0x50010149u) << "Details, as the browser asked";
+  SHELLFLAGSTATE shell{};
+  shell.fWin95Classic = TRUE;  // what a shell that doesn't know the setting leaves
+  SHGetSettings(&shell, SSF_DOUBLECLICKINWEBVIEW | SSF_WIN95CLASSIC);
+  EXPECT_EQ(ListView_GetExtendedListViewStyle(list), (shell.fWin95Classic || shell.fDoubleClickInWebView) ? 0u : 0x848u)
+      << "the user's click setting";
+  com::ComPtr<IShellView> view;
+  ASSERT_EQ(browser->GetCurrentView(IID_IShellView, view.PutVoid()), S_OK);
+  com::ComPtr<IOleCommandTarget> commands;
+  ASSERT_EQ(view->QueryInterface(IID_IOleCommandTarget, commands.PutVoid()), S_OK);
+  EXPECT_EQ(commands->Exec(nullptr, 1284, 0, nullptr, nullptr), S_OK);
+  EXPECT_EQ(static_cast<DWORD>(GetWindowLongW(list, GWL_STYLE)), 0x5001014Au) << "Small Icons";
+  view.Reset(), commands.Reset();
+
+  ListView_SetItemState(list, 2, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
+  EXPECT_EQ(ListView_GetNextItem(list, -1, LVNI_SELECTED), 2);
+  SendMessageW(list, WM_KEYDOWN, VK_RETURN, 0);
+  HWND levelList = CurrentList(browser.Get());
+  ASSERT_TRUE(levelList);
+  EXPECT_NE(levelList, list) << "a new view on the level";
+  EXPECT_EQ(Rows(levelList), std::vector<std::wstring>{L"file1.tkf"});
+  EXPECT_EQ(static_cast<DWORD>(GetWindowLongW(levelList, GWL_STYLE)), 0x5001014Au) << "the mode of our view before";
+  EXPECT_EQ(browser->Destroy(), S_OK);
+  browser.Reset();
+  DestroyWindow(frame);
 }
 
 // Runs last: the test above has released all it got from the shell.

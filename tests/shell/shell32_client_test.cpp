@@ -4,8 +4,11 @@
 #include <gtest/gtest.h>
 #include <shellapi.h>
 #include <commctrl.h>
+#include <commdlg.h>
 
+#include <atomic>
 #include <functional>
+#include <thread>
 
 #include "support/registry_sandbox.h"
 
@@ -166,6 +169,85 @@ TEST(ExplorerBrowserClient, ShowsTheLevelsAndMovesIntoALevelWhenItIsActivated) {
   EXPECT_EQ(browser->Destroy(), S_OK);
   browser.Reset();
   DestroyWindow(frame);
+}
+
+// comdlg32's Open dialog, driven from a second thread as a person would; the dialog's
+// own thread only answers what the hook asks of it.
+struct OpenDialogRun {
+  std::atomic<HWND> hook{nullptr}, dialog{nullptr};
+  std::atomic<int> fileOk{0};
+};
+OpenDialogRun* openDialog = nullptr;
+constexpr UINT kBrowseTo = WM_APP + 1;
+
+UINT_PTR CALLBACK OpenDialogHook(HWND hook, UINT message, WPARAM, LPARAM lParam) {
+  if (message == WM_INITDIALOG) openDialog->hook = hook;
+  if (message == WM_NOTIFY && reinterpret_cast<NMHDR*>(lParam)->code == CDN_INITDONE) openDialog->dialog = GetParent(hook);
+  if (message == WM_NOTIFY && reinterpret_cast<NMHDR*>(lParam)->code == CDN_FILEOK) ++openDialog->fileOk;
+  if (message == kBrowseTo) {
+    // The dialog's own browser, as every view inside it sees it.
+    auto* browser = reinterpret_cast<IShellBrowser*>(SendMessageW(GetParent(hook), WM_USER + 7, 0, 0));
+    SetWindowLongPtrW(hook, DWLP_MSGRESULT,
+                      browser ? browser->BrowseObject(reinterpret_cast<LPCITEMIDLIST>(lParam), SBSP_ABSOLUTE) : E_FAIL);
+    return TRUE;
+  }
+  return 0;
+}
+
+// The view the dialog shows, once filled with `rows` rows.
+HWND DialogList(HWND dialog, size_t rows) {
+  HWND list = nullptr;
+  PumpUntil([&] {
+    HWND view = FindWindowExW(dialog, nullptr, L"TSViewNSClass", nullptr);
+    list = view ? GetDlgItem(view, 2000) : nullptr;
+    return list && !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr) && Rows(list).size() == rows;
+  });
+  return list;
+}
+
+void ActivateRow(HWND list, int row) {
+  ListView_SetItemState(list, -1, 0, LVIS_SELECTED);
+  ListView_SetItemState(list, row, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
+  SendMessageW(list, WM_KEYDOWN, VK_RETURN, 0);
+}
+
+TEST(OpenDialogClient, ListsTheLevelsOpensOneAndTakesItsFileAsTheDefaultCommand) {
+  RegistrySandbox sandbox;
+  SeedLevel(0, L"North Site");
+  OpenDialogRun run;
+  openDialog = &run;
+  UniqueList folder;
+  ASSERT_EQ(SHParseDisplayName(kFolderPath, nullptr, folder.Put(), 0, nullptr), S_OK);
+  std::vector<std::wstring> rootRows, levelRows;
+  HRESULT browsed = E_PENDING;
+  std::thread person([&] {
+    PumpUntil([&] { return run.dialog.load() != nullptr; });
+    if (!run.dialog) return;
+    browsed = static_cast<HRESULT>(SendMessageW(run.hook, kBrowseTo, 0, reinterpret_cast<LPARAM>(folder.Get())));
+    HWND list = DialogList(run.dialog, 2);
+    rootRows = list ? Rows(list) : rootRows;
+    if (list) ActivateRow(list, 1);
+    HWND levelList = DialogList(run.dialog, 1);
+    levelRows = levelList ? Rows(levelList) : levelRows;
+    if (levelList) ActivateRow(levelList, 0);
+    PumpUntil([&] { return run.fileOk > 0 || !IsWindow(run.dialog); }, 3000);
+    if (IsWindow(run.dialog)) PostMessageW(run.dialog, WM_COMMAND, IDCANCEL, 0);
+  });
+  wchar_t file[MAX_PATH] = {};
+  OPENFILENAMEW ofn{sizeof(ofn)};
+  ofn.lpstrFile = file;
+  ofn.nMaxFile = MAX_PATH;
+  ofn.Flags = OFN_EXPLORER | OFN_ENABLEHOOK;
+  ofn.lpfnHook = OpenDialogHook;
+  BOOL chosen = GetOpenFileNameW(&ofn);
+  person.join();
+  openDialog = nullptr;
+  EXPECT_EQ(browsed, S_OK);
+  EXPECT_EQ(rootRows, (std::vector<std::wstring>{L"Add New Digital Level", L"North Site"}));
+  EXPECT_EQ(levelRows, std::vector<std::wstring>{L"file1.tkf"});
+  EXPECT_EQ(run.fileOk, 1) << "the file reached the dialog's default command";
+  EXPECT_TRUE(chosen);
+  EXPECT_STREQ(file, (kParsingRoot + L"\\North Site\\file1.tkf").c_str());
 }
 
 // Runs last: the test above has released all it got from the shell.

@@ -1,0 +1,161 @@
+// What opening the view costs as the store grows. CreateViewWindow must not read the
+// store, so its time should not grow from 10 to 10,000 levels; the time until the list
+// is filled is set against the bare registry walk of the same levels.
+// Runs on a scratch copy of HKEY_CURRENT_USER and removes it afterwards.
+#include <windows.h>
+#include <commctrl.h>
+#include <shlobj.h>
+
+#include <algorithm>
+#include <chrono>
+#include <cstdio>
+#include <string>
+#include <vector>
+
+#include "shell/shell_folder.h"
+#include "shell/shell_view.h"
+#include "store/station_record.h"
+
+namespace {
+
+using Clock = std::chrono::steady_clock;
+
+// The least a browser must do for a view: give it a window.
+class Browser : public com::ComObject<IShellBrowser> {
+ public:
+  explicit Browser(HWND frame) : frame_(frame) {}
+  STDMETHODIMP GetWindow(HWND* window) override { *window = frame_; return S_OK; }
+  STDMETHODIMP ContextSensitiveHelp(BOOL) override { return E_NOTIMPL; }
+  STDMETHODIMP InsertMenusSB(HMENU, LPOLEMENUGROUPWIDTHS) override { return S_OK; }
+  STDMETHODIMP SetMenuSB(HMENU, HOLEMENU, HWND) override { return S_OK; }
+  STDMETHODIMP RemoveMenusSB(HMENU) override { return S_OK; }
+  STDMETHODIMP SetStatusTextSB(LPCWSTR) override { return S_OK; }
+  STDMETHODIMP EnableModelessSB(BOOL) override { return S_OK; }
+  STDMETHODIMP TranslateAcceleratorSB(MSG*, WORD) override { return S_FALSE; }
+  STDMETHODIMP BrowseObject(PCUIDLIST_RELATIVE, UINT) override { return E_NOTIMPL; }
+  STDMETHODIMP GetViewStateStream(DWORD, IStream** stream) override { *stream = nullptr; return E_NOTIMPL; }
+  STDMETHODIMP GetControlWindow(UINT, HWND* window) override { *window = nullptr; return E_NOTIMPL; }
+  STDMETHODIMP SendControlMsg(UINT, UINT, WPARAM, LPARAM, LRESULT* result) override {
+    if (result) *result = 0;
+    return S_OK;
+  }
+  STDMETHODIMP QueryActiveShellView(IShellView** view) override { *view = nullptr; return E_NOTIMPL; }
+  STDMETHODIMP OnViewWindowActive(IShellView*) override { return S_OK; }
+  STDMETHODIMP SetToolbarItems(LPTBBUTTONSB, UINT, UINT) override { return S_OK; }
+
+ private:
+  HWND frame_;
+};
+
+void Seed(int count) {
+  HKEY levels = nullptr;
+  RegCreateKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &levels,
+                  nullptr);
+  for (int i = 0; i < count; ++i) {
+    std::wstring key = L"Station " + std::to_wstring(i), name = L"Level " + std::to_wstring(i);
+    HKEY level = nullptr;
+    RegCreateKeyExW(levels, key.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &level, nullptr);
+    RegSetValueExW(level, L"Name", 0, REG_SZ, reinterpret_cast<const BYTE*>(name.c_str()),
+                   static_cast<DWORD>((name.size() + 1) * sizeof(wchar_t)));
+    RegCloseKey(level);
+  }
+  RegCloseKey(levels);
+}
+
+size_t BareWalk() {
+  HKEY levels = nullptr;
+  if (RegOpenKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, KEY_READ, &levels) != ERROR_SUCCESS) return 0;
+  size_t count = 0;
+  for (DWORD index = 0;; ++index) {
+    wchar_t key[MAX_PATH];
+    DWORD length = MAX_PATH;
+    if (RegEnumKeyExW(levels, index, key, &length, nullptr, nullptr, nullptr, nullptr) != ERROR_SUCCESS) break;
+    HKEY level = nullptr;
+    if (RegOpenKeyExW(levels, key, 0, KEY_READ, &level) != ERROR_SUCCESS) continue;
+    wchar_t name[MAX_PATH + 1];
+    DWORD size = MAX_PATH * sizeof(wchar_t);
+    if (RegQueryValueExW(level, L"Name", nullptr, nullptr, reinterpret_cast<BYTE*>(name), &size) == ERROR_SUCCESS)
+      ++count;
+    RegCloseKey(level);
+  }
+  RegCloseKey(levels);
+  return count;
+}
+
+double Since(Clock::time_point start) { return std::chrono::duration<double>(Clock::now() - start).count(); }
+
+double Median(std::vector<double> values) {
+  std::sort(values.begin(), values.end());
+  return values[values.size() / 2];
+}
+
+struct Times {
+  double create, filled, bare;
+  size_t rows;
+};
+
+// Median of `rounds` openings, each followed by a bare walk, so both sides see the same machine.
+Times Measure(IShellFolder* folder, IShellBrowser* browser, int rounds) {
+  std::vector<double> create, filled, bare;
+  size_t rows = 0;
+  for (int i = 0; i < rounds; ++i) {
+    com::ComPtr<IShellView> view;
+    folder->CreateViewObject(nullptr, IID_IShellView, view.PutVoid());
+    FOLDERSETTINGS settings{FVM_DETAILS, 0};
+    RECT rect{0, 0, 640, 480};
+    HWND window = nullptr;
+    auto start = Clock::now();
+    view->CreateViewWindow(nullptr, &settings, browser, &rect, &window);
+    create.push_back(Since(start));
+    HWND list = GetDlgItem(window, kListWindowId);
+    while (FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr)) {
+      MsgWaitForMultipleObjects(0, nullptr, FALSE, 1, QS_ALLINPUT);
+      MSG msg;
+      while (PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE)) DispatchMessageW(&msg);
+    }
+    filled.push_back(Since(start));
+    rows = static_cast<size_t>(SendMessageW(list, LVM_GETITEMCOUNT, 0, 0));
+    view->DestroyViewWindow();
+    view.Reset();
+    start = Clock::now();
+    BareWalk();
+    bare.push_back(Since(start));
+  }
+  return {Median(create), Median(filled), Median(bare), rows};
+}
+
+}  // namespace
+
+int main() {
+  OleInitialize(nullptr);
+  const std::wstring scratchPath = L"Software\\MarlixBenchView" + std::to_wstring(GetCurrentProcessId());
+  HKEY scratch = nullptr;
+  if (RegCreateKeyExW(HKEY_CURRENT_USER, scratchPath.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &scratch,
+                      nullptr) != ERROR_SUCCESS ||
+      RegOverridePredefKey(HKEY_CURRENT_USER, scratch) != ERROR_SUCCESS) {
+    std::fprintf(stderr, "no scratch key\n");
+    return 1;
+  }
+  {
+    HWND frame = CreateWindowExW(0, L"STATIC", nullptr, WS_OVERLAPPEDWINDOW, 0, 0, 640, 480, nullptr, nullptr,
+                                 nullptr, nullptr);
+    auto browser = com::Make<Browser>(frame);
+    auto folder = com::Make<CMarlixDLShellFolder>();
+    folder->Initialize(nullptr);
+    Times small{}, large{};
+    for (auto [levels, rounds, out] : {std::tuple{10, 201, &small}, std::tuple{10000, 7, &large}}) {
+      Seed(levels);  // the first keys are rewritten, the rest added
+      *out = Measure(folder.Get(), browser.Get(), rounds);
+      std::printf("%6d levels: CreateViewWindow %8.3f ms, filled list %9.3f ms, bare registry %9.3f ms, "
+                  "filled/bare %6.2f (rows %zu)\n",
+                  levels, out->create * 1e3, out->filled * 1e3, out->bare * 1e3, out->filled / out->bare, out->rows);
+    }
+    std::printf("CreateViewWindow 10,000/10 levels: ratio %.2f\n", large.create / small.create);
+    DestroyWindow(frame);
+  }
+  RegOverridePredefKey(HKEY_CURRENT_USER, nullptr);
+  RegCloseKey(scratch);
+  RegDeleteTreeW(HKEY_CURRENT_USER, scratchPath.c_str());
+  OleUninitialize();
+  return 0;
+}

@@ -3,6 +3,7 @@
 
 #include <new>
 
+#include "base/boundary.h"
 #include "base/module_instance.h"
 #include "base/resource_ids.h"
 #include "shell/shell_folder_base.h"
@@ -67,10 +68,12 @@ STDMETHODIMP CMarlixDLShellView::TranslateAccelerator(MSG* msg) {
 STDMETHODIMP CMarlixDLShellView::EnableModeless(BOOL) { return E_NOTIMPL; }
 
 STDMETHODIMP CMarlixDLShellView::UIActivate(UINT state) {
-  if (state == UIState) return S_OK;
-  ActivateUI(state);
-  if (state != SVUIA_DEACTIVATE) SetStatusText();
-  return S_OK;
+  return boundary::Call([&] {
+    if (state == UIState) return S_OK;
+    ActivateUI(state);
+    if (state != SVUIA_DEACTIVATE) SetStatusText();
+    return S_OK;
+  });
 }
 
 STDMETHODIMP CMarlixDLShellView::Refresh() {

@@ -2,6 +2,7 @@
 // and opening items.
 #include "shell/shell_view.h"
 
+#include "base/boundary.h"
 #include "helpers/win_handles.h"
 #include "server/class_ids.h"
 
@@ -40,8 +41,10 @@ STDMETHODIMP CMarlixDLShellView::QueryStatus(const GUID* group, ULONG count, OLE
 // group equals both.
 STDMETHODIMP CMarlixDLShellView::Exec(const GUID* group, DWORD id, DWORD, VARIANT*, VARIANT*) {
   if (group && *group == CGID_Explorer && *group == CGID_ShellDocView) return OLECMDERR_E_UNKNOWNGROUP;
-  OnCommand(id);
-  return S_OK;
+  return boundary::Call([&] {
+    OnCommand(id);
+    return S_OK;
+  });
 }
 
 void CMarlixDLShellView::ActivateUI(UINT state) {

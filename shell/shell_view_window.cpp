@@ -5,11 +5,13 @@
 #include <ole2.h>
 #include <windowsx.h>
 
+#include "base/boundary.h"
 #include "base/module_instance.h"
 #include "base/resource_ids.h"
 #include "base/window_messages.h"
 #include "shell/item_services.h"
 #include "shell/shell_uuids.h"
+#include "transfer/drop_target.h"
 
 namespace {
 
@@ -61,7 +63,8 @@ LRESULT CALLBACK ViewWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM
   if (!view) return DefWindowProcW(window, message, wParam, lParam);
   // A message may end in the browser letting go of the view (browsing away).
   com::ComPtr<CMarlixDLShellView> keep(view);
-  return view->HandleMessage(message, wParam, lParam);
+  return boundary::CallWindow(window, message, wParam, lParam,
+                              [&] { return view->HandleMessage(message, wParam, lParam); });
 }
 
 LRESULT CMarlixDLShellView::HandleMessage(UINT message, WPARAM wParam, LPARAM lParam) {
@@ -195,6 +198,11 @@ bool CMarlixDLShellView::CreateListWindow() {
   if (!ListWindow) return false;
   ApplyShellSettings();
   ListControl.Subclass(ListWindow);
+  // The target holds the view until RevokeDragDrop lets it go in WM_DESTROY.
+  if (auto target = com::Make<CMarlixDLDropTargetOnListView>()) {
+    target->SetTarget(ListWindow, this, FolderIdList);
+    RegisterDragDrop(ListWindow, target.Get());
+  }
   return true;
 }
 
@@ -323,6 +331,10 @@ void CShellViewListWindow::Detach() {
 
 LRESULT CALLBACK CShellViewListWindow::Procedure(HWND window, UINT message, WPARAM wParam, LPARAM lParam, UINT_PTR,
                                                  DWORD_PTR self) {
+  return boundary::CallWindow(window, message, wParam, lParam, [&] { return Handle(window, message, wParam, lParam, self); });
+}
+
+LRESULT CShellViewListWindow::Handle(HWND window, UINT message, WPARAM wParam, LPARAM lParam, DWORD_PTR self) {
   switch (message) {
     case WM_GETDLGCODE:
       return DefSubclassProc(window, message, wParam, lParam) | DLGC_WANTALLKEYS;

@@ -249,6 +249,7 @@ TEST_F(View, RootShowsTheAddRowFirstThenTheLevelsInOrderFromAThreadBehindTheClip
                            reinterpret_cast<LPARAM>(MAKEINTRESOURCEW(103)))) << "resource 103 is a clip the control reads";
   DestroyWindow(probe);
   EXPECT_EQ(Rows(view), Texts{}) << "CreateViewWindow returns before the store is read";
+  EXPECT_TRUE(GetPropW(ListOf(view), L"OleDropTargetInterface")) << "the list takes drops";
   ASSERT_TRUE(PumpUntil([&] { return !AnimationOf(view); }));
   EXPECT_EQ(Rows(view), kRootRows);
   EXPECT_EQ(Images(view), (std::vector<int>{IMAGE_ADD_LEVEL, IMAGE_LEVEL, IMAGE_LEVEL, IMAGE_LEVEL}));

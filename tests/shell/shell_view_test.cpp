@@ -319,23 +319,11 @@ TEST_F(View, ANewViewTakesTheModeOfOursOrOfTheStreamOrOfTheBrowser) {
   browser_->SeedMode(FVM_LIST);
   Open(root_.Get(), FVM_DETAILS, ours);
   EXPECT_EQ(Mode(Last()), 2u) << "after one of ours";
-  // A foreign view: answers IShellView, not the marker.
-  struct Foreign : com::ComObject<IShellView> {
-    STDMETHODIMP GetWindow(HWND*) override { return E_NOTIMPL; }
-    STDMETHODIMP ContextSensitiveHelp(BOOL) override { return E_NOTIMPL; }
-    STDMETHODIMP TranslateAccelerator(MSG*) override { return S_FALSE; }
-    STDMETHODIMP EnableModeless(BOOL) override { return E_NOTIMPL; }
-    STDMETHODIMP UIActivate(UINT) override { return S_OK; }
-    STDMETHODIMP Refresh() override { return S_OK; }
-    STDMETHODIMP CreateViewWindow(IShellView*, LPCFOLDERSETTINGS, IShellBrowser*, RECT*, HWND*) override { return E_NOTIMPL; }
-    STDMETHODIMP DestroyViewWindow() override { return S_OK; }
-    STDMETHODIMP GetCurrentInfo(LPFOLDERSETTINGS s) override { s->ViewMode = FVM_SMALLICON; return S_OK; }
-    STDMETHODIMP AddPropertySheetPages(DWORD, LPFNSVADDPROPSHEETPAGE, LPARAM) override { return E_NOTIMPL; }
-    STDMETHODIMP SaveViewState() override { return S_OK; }
-    STDMETHODIMP SelectItem(PCUITEMID_CHILD, UINT) override { return E_NOTIMPL; }
-    STDMETHODIMP GetItemObject(UINT, REFIID, void**) override { return E_NOTIMPL; }
-  };
-  auto other = com::Make<Foreign>();
+  // A foreign view: Wine's own view of the desktop.
+  com::ComPtr<IShellFolder> desktop;
+  com::ComPtr<IShellView> other;
+  ASSERT_EQ(SHGetDesktopFolder(desktop.Put()), S_OK);
+  ASSERT_EQ(desktop->CreateViewObject(nullptr, IID_IShellView, other.PutVoid()), S_OK);
   Open(root_.Get(), FVM_DETAILS, other.Get());
   EXPECT_EQ(Mode(Last()), 3u) << "after a foreign view, from the stream";
   Open(root_.Get(), FVM_DETAILS);

@@ -135,6 +135,7 @@ STDMETHODIMP CMarlixDLShellView::CreateViewWindow(IShellView* previous, LPCFOLDE
   }
   *out = window;
   Accelerators = LoadAcceleratorsW(module, MAKEINTRESOURCEW(IDR_VIEW_ACCELERATORS));
+  NotifyWindow.ViewWindow = ViewWindow;
   if (!IsWindow(NotifyWindow.Hidden)) CreateNotifyWindow(NotifyWindow, ViewWindow);
   return S_OK;
 }

@@ -1,0 +1,253 @@
+// Drops on the root view as Wine's ExplorerBrowser hosts it: a second process drags real
+// files, or the virtual file of a level, over a level row with real mouse input, and the
+// drop is refused; the same target called directly for what a mouse can't make.
+#include <windows.h>
+#include <commctrl.h>
+#include <shlobj.h>
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <filesystem>
+#include <fstream>
+#include <functional>
+#include <sstream>
+#include <thread>
+
+#include "shell/shell_test_util.h"
+#include "store/station_record.h"
+#include "support/registry_sandbox.h"
+
+namespace {
+
+const wchar_t kFolder[] = L"::{20D04FE0-3AEA-1069-A2D8-08002B30309D}\\::{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}";
+
+// Every level's values, as one text: what "the store is unchanged" compares.
+std::wstring StoreText() {
+  std::wstring text;
+  HKEY levels = nullptr;
+  if (RegOpenKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, KEY_READ, &levels)) return text;
+  wchar_t name[256], value[256];
+  BYTE data[600];
+  for (DWORD i = 0, length = 256; !RegEnumKeyExW(levels, i, name, &length, nullptr, nullptr, nullptr, nullptr);
+       ++i, length = 256) {
+    HKEY level = nullptr;
+    RegOpenKeyExW(levels, name, 0, KEY_READ, &level);
+    text += name;
+    for (DWORD v = 0, valueLength = 256, size = sizeof(data);
+         !RegEnumValueW(level, v, value, &valueLength, nullptr, nullptr, data, &size);
+         ++v, valueLength = 256, size = sizeof(data))
+      text += L"|" + std::wstring(value) + L"=" + std::wstring(reinterpret_cast<wchar_t*>(data), size / 2);
+    RegCloseKey(level);
+    text += L"\n";
+  }
+  RegCloseKey(levels);
+  return text;
+}
+
+bool Pump(const std::function<bool()>& done, DWORD milliseconds = 20000) {
+  for (DWORD start = GetTickCount(); !done();) {
+    if (GetTickCount() - start > milliseconds) return false;
+    MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT);
+    for (MSG msg; PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE);) DispatchMessageW(&msg);
+  }
+  return true;
+}
+
+void Mouse(DWORD flags, POINT at = {}) {
+  INPUT input{};
+  input.type = INPUT_MOUSE;
+  input.mi.dwFlags = flags | MOUSEEVENTF_ABSOLUTE | MOUSEEVENTF_MOVE;
+  input.mi.dx = at.x * 65536 / GetSystemMetrics(SM_CXSCREEN) + 1;
+  input.mi.dy = at.y * 65536 / GetSystemMetrics(SM_CYSCREEN) + 1;
+  SendInput(1, &input, sizeof(input));
+}
+
+// Whether the peer's source was shown the copy effect during the drag.
+bool SawCopy(const std::string& report) {
+  size_t at = report.find("effects ");
+  return at != std::string::npos && (std::stoul(report.substr(at + 8)) & (1u << DROPEFFECT_COPY));
+}
+
+// The second process: shell_peer, its output in a file read when it has ended.
+struct Peer {
+  explicit Peer(const std::wstring& arguments) {
+    wchar_t folder[MAX_PATH];
+    GetTempPathW(MAX_PATH, folder);
+    output = std::wstring(folder) + L"drop_peer_" + std::to_wstring(GetCurrentProcessId()) + L".txt";
+    SECURITY_ATTRIBUTES inherit{sizeof(inherit), nullptr, TRUE};
+    HANDLE file = CreateFileW(output.c_str(), GENERIC_WRITE, FILE_SHARE_READ, &inherit, CREATE_ALWAYS, 0, nullptr);
+    STARTUPINFOW startup{sizeof(startup)};
+    startup.dwFlags = STARTF_USESTDHANDLES;
+    startup.hStdOutput = startup.hStdError = file;
+    wchar_t peer[MAX_PATH] = {};
+    GetEnvironmentVariableW(L"MARLIX_SHELL_PEER", peer, MAX_PATH);
+    std::wstring command = L"\"" + std::wstring(peer) + L"\" " + arguments;
+    PROCESS_INFORMATION info{};
+    if (CreateProcessW(nullptr, command.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr, &startup, &info)) {
+      process = info.hProcess;
+      CloseHandle(info.hThread);
+    }
+    CloseHandle(file);
+  }
+  ~Peer() {
+    if (process) TerminateProcess(process, 9), CloseHandle(process);
+    DeleteFileW(output.c_str());
+  }
+  std::string Output() const {
+    std::ifstream in{std::filesystem::path(output)};
+    std::stringstream text;
+    text << in.rdbuf();
+    return text.str();
+  }
+  HANDLE process = nullptr;
+  std::wstring output;
+};
+
+// The root view in Wine's ExplorerBrowser, on screen at the top left, over a store of two
+// levels in the prefix's own registry (the peer process must see them too).
+class DropOnRootView : public testing::Test {
+ protected:
+  void SetUp() override {
+    SeedLevel(0, L"Alpha");
+    SeedLevel(1, L"Beta");
+    before_ = StoreText();
+    frame_ = CreateWindowExW(0, L"STATIC", nullptr, WS_POPUP | WS_VISIBLE, 0, 0, 400, 300, nullptr, nullptr, nullptr,
+                             nullptr);
+    ASSERT_EQ(CoCreateInstance(CLSID_ExplorerBrowser, nullptr, CLSCTX_INPROC_SERVER, IID_IExplorerBrowser,
+                               browser_.PutVoid()), S_OK);
+    RECT rect{0, 0, 400, 300};
+    FOLDERSETTINGS settings{FVM_DETAILS, 0};
+    ASSERT_EQ(browser_->Initialize(frame_, &rect, &settings), S_OK);
+    UniqueList folder;
+    ASSERT_EQ(SHParseDisplayName(kFolder, nullptr, folder.Put(), 0, nullptr), S_OK);
+    ASSERT_EQ(browser_->BrowseToIDList(folder.Get(), SBSP_ABSOLUTE), S_OK);
+    com::ComPtr<IShellView> view;
+    HWND window = nullptr;
+    ASSERT_EQ(browser_->GetCurrentView(IID_IShellView, view.PutVoid()), S_OK);
+    ASSERT_EQ(view->GetWindow(&window), S_OK);
+    list_ = GetDlgItem(window, 2000);
+    ASSERT_TRUE(Pump([&] { return ListView_GetItemCount(list_) == 3; })) << "filled";
+    target_ = static_cast<IDropTarget*>(GetPropW(list_, L"OleDropTargetInterface"));
+    ASSERT_TRUE(target_) << "the list is a registered target";
+  }
+  void TearDown() override {
+    EXPECT_EQ(StoreText(), before_) << "no level changed";
+    EXPECT_FALSE(FindWindowW(L"#32770", nullptr)) << "no dialog came up";
+    if (browser_) browser_->Destroy();
+    browser_.Reset();
+    DestroyWindow(frame_);
+    RegDeleteTreeW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str());
+  }
+  // The screen point at the middle of a row.
+  POINT RowPoint(int row) {
+    RECT rect{};
+    ListView_GetItemRect(list_, row, &rect, LVIR_LABEL);
+    POINT point{(rect.left + rect.right) / 2, (rect.top + rect.bottom) / 2};
+    ClientToScreen(list_, &point);
+    return point;
+  }
+  std::vector<int> Selected() {
+    std::vector<int> rows;
+    for (int row = -1; (row = ListView_GetNextItem(list_, row, LVNI_SELECTED)) >= 0;) rows.push_back(row);
+    return rows;
+  }
+  // The peer drags `items` from its window onto `row` as a hand would; answers the peer's
+  // report and, in `seen`, the selection while the pointer rested on the row.
+  std::string DragOnto(int row, const std::wstring& items, std::vector<int>& seen) {
+    Peer peer(L"drag 500 20 30 " + items);
+    if (!Pump([&] { return peer.Output().find("ready") != std::string::npos; })) return "peer not ready";
+    std::atomic<int> stage{0};
+    POINT to = RowPoint(row);
+    std::thread hand([&] {
+      Mouse(0, {600, 90});
+      Sleep(200);
+      Mouse(MOUSEEVENTF_LEFTDOWN, {600, 90});
+      for (int step = 1; step <= 10; ++step) {
+        Sleep(60);
+        Mouse(0, {600 + (to.x - 600) * step / 10, 90 + (to.y - 90) * step / 10});
+      }
+      Sleep(300);
+      stage = 1;  // resting on the row
+      while (stage == 1) Sleep(10);
+      Mouse(MOUSEEVENTF_LEFTUP, to);
+    });
+    Pump([&] { return stage == 1; });
+    Pump([] { return false; }, 200);
+    seen = Selected();
+    stage = 2;
+    Pump([&] { return WaitForSingleObject(peer.process, 0) == WAIT_OBJECT_0; });
+    hand.join();
+    return peer.Output();
+  }
+
+  HWND frame_ = nullptr;
+  HWND list_ = nullptr;
+  IDropTarget* target_ = nullptr;
+  com::ComPtr<IExplorerBrowser> browser_;
+  std::wstring before_;
+};
+
+// Copy is offered while the files are over a level row, which alone is selected; the drop
+// itself is refused with E_INVALIDARG and nothing happens.
+TEST_F(DropOnRootView, FilesFromAnotherProcessLightUpALevelAndAreRefused) {
+  wchar_t temp[MAX_PATH];
+  GetTempPathW(MAX_PATH, temp);
+  const std::wstring file = std::wstring(temp) + L"survey.txt";
+  std::ofstream(std::filesystem::path(file)) << "points";
+  ListView_SetItemState(list_, 0, LVIS_SELECTED, LVIS_SELECTED);
+  ListView_SetItemState(list_, 2, LVIS_SELECTED, LVIS_SELECTED);
+  std::vector<int> seen;
+  std::string report = DragOnto(1, L"\"" + file + L"\"", seen);
+  EXPECT_EQ(seen, std::vector<int>{1}) << "the row under the pointer alone";
+  EXPECT_TRUE(SawCopy(report)) << report;
+  // DragEnter and the refused drop write no effect, so the source keeps what it allowed.
+  EXPECT_NE(report.find("result 0x80070057 7"), std::string::npos) << report;
+  EXPECT_EQ(Selected(), std::vector<int>{1}) << "the refused row stays selected";
+  DeleteFileW(file.c_str());
+}
+
+// The virtual file offers both halves, so it is taken while it moves, and refused at the
+// drop: the instrument is never asked.
+TEST_F(DropOnRootView, TheVirtualFileOfALevelIsRefusedWithoutATransfer) {
+  std::vector<int> seen;
+  std::string report = DragOnto(2, std::wstring(kFolder) + L"\\Alpha\\file1.tkf", seen);
+  EXPECT_EQ(seen, std::vector<int>{2});
+  EXPECT_TRUE(SawCopy(report)) << report;
+  EXPECT_NE(report.find("result 0x80070057 7"), std::string::npos) << report;
+}
+
+// What a mouse can't make: a drop on the add row or on empty space, no effect pointer,
+// and a target whose view has gone.
+TEST_F(DropOnRootView, TheRegisteredTargetRefusesTheAddRowEmptySpaceAndAGoneView) {
+  com::ComPtr<IShellFolder> desktop;
+  ASSERT_EQ(SHGetDesktopFolder(desktop.Put()), S_OK);
+  com::ComPtr<IDataObject> data;
+  UniqueList folder;
+  ASSERT_EQ(SHParseDisplayName(kFolder, nullptr, folder.Put(), 0, nullptr), S_OK);
+  LPCITEMIDLIST items[] = {folder.Get()};
+  ASSERT_EQ(desktop->GetUIObjectOf(nullptr, 1, items, IID_IDataObject, nullptr, data.PutVoid()), S_OK);
+  ASSERT_EQ(target_->DragEnter(data.Get(), MK_LBUTTON, POINTL{RowPoint(1).x, RowPoint(1).y}, nullptr), S_OK)
+      << "an id array is taken";
+  ListView_SetItemState(list_, 2, LVIS_SELECTED, LVIS_SELECTED);
+  DWORD effect = DROPEFFECT_NONE;
+  POINT add = RowPoint(0);
+  EXPECT_EQ(target_->DragOver(0, {add.x, add.y}, &effect), E_INVALIDARG) << "the add row";
+  EXPECT_EQ(target_->DragOver(0, {200, 280}, &effect), E_INVALIDARG) << "empty space";
+  EXPECT_EQ(target_->Drop(data.Get(), 0, {add.x, add.y}, &effect), E_INVALIDARG);
+  EXPECT_EQ(effect, DWORD(DROPEFFECT_NONE)) << "a refusal writes no effect";
+  EXPECT_EQ(Selected(), std::vector<int>{2}) << "and moves no selection";
+  POINT level = RowPoint(1);
+  EXPECT_EQ(target_->DragOver(0, {level.x, level.y}, nullptr), S_OK) << "no effect pointer";
+  EXPECT_EQ(target_->DragOver(0, {level.x, level.y}, &effect), S_OK);
+  EXPECT_EQ(effect, DWORD(DROPEFFECT_COPY)) << "copy, though the source allowed nothing";
+  EXPECT_EQ(target_->Drop(data.Get(), 0, {level.x, level.y}, &effect), E_INVALIDARG) << "the level refuses";
+  target_->AddRef();  // as a drag in progress holds it
+  browser_->Destroy();
+  browser_.Reset();
+  EXPECT_EQ(target_->DragOver(0, {level.x, level.y}, &effect), E_INVALIDARG) << "the view has gone";
+  EXPECT_EQ(target_->Drop(data.Get(), 0, {level.x, level.y}, &effect), E_INVALIDARG);
+  target_->Release();
+}
+
+}  // namespace

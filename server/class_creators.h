@@ -1,6 +1,5 @@
 // The creators behind the eight class objects of the object map. Each class's own
-// source defines its creator; a class whose code is not in the module yet has its
-// creator in server/pending_classes.cpp, answering CLASS_E_CLASSNOTAVAILABLE.
+// source defines its creator.
 #pragma once
 #include <windows.h>
 

@@ -6,6 +6,7 @@
 #include "base/boundary.h"
 #include "base/module_instance.h"
 #include "base/resource_ids.h"
+#include "server/class_creators.h"
 #include "shell/shell_folder_base.h"
 #include "store/string_table.h"
 
@@ -223,3 +224,6 @@ void CMarlixDLShellView::RefreshAll() {
   if (SUCCEEDED(ShellBrowser->GetWindow(&browserWindow)) && browserWindow)
     SendMessageW(browserWindow, WM_COMMAND, kCmdBrowserRefresh, 0);
 }
+
+// Made from outside, a view has no folder until one calls Init: it shows an empty list.
+HRESULT CreateMarlixDLShellView(REFIID riid, void** ppv) { return com::CreateInstance<CMarlixDLShellView>(riid, ppv); }

@@ -10,9 +10,11 @@
 #include <functional>
 
 #include "base/window_messages.h"
+#include "server/class_creators.h"
 #include "shell/item_services.h"
 #include "shell/shell_folder.h"
 #include "shell/shell_test_util.h"
+#include "server/class_creators.h"
 #include "shell/shell_view.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
@@ -457,6 +459,25 @@ TEST_F(View, FailingEnumerationLeavesTheListEmptyWithoutTheAddRow) {
 TEST_F(View, ABrowserWithoutAWindowGetsNoView) {
   browser_->windowFails = true;
   EXPECT_FALSE(Open(root_.Get(), FVM_DETAILS, nullptr, nullptr, true, E_FAIL));
+}
+
+// Made by its class object, a view has no folder: its window opens on an empty list and
+// takes no drop.
+TEST_F(View, AViewWithoutAFolderOpensEmpty) {
+  com::ComPtr<IShellView> view;
+  ASSERT_EQ(CreateMarlixDLShellView(IID_IShellView, view.PutVoid()), S_OK);
+  FOLDERSETTINGS settings{FVM_DETAILS, 0};
+  RECT rect{0, 0, 400, 300};
+  HWND window = nullptr;
+  ASSERT_EQ(view->CreateViewWindow(nullptr, &settings, browser_.Get(), &rect, &window), S_OK);
+  views_.push_back(view);
+  EXPECT_EQ(SendMessageW(ListOf(window), LVM_GETITEMCOUNT, 0, 0), 0);
+  EXPECT_FALSE(AnimationOf(window)) << "nothing to enumerate";
+  auto* target = static_cast<IDropTarget*>(GetPropW(ListOf(window), L"OleDropTargetInterface"));
+  ASSERT_TRUE(target);
+  DWORD effect = 0;
+  EXPECT_EQ(target->DragOver(0, {10, 10}, &effect), E_INVALIDARG);
+  EXPECT_EQ(view->Refresh(), S_OK);
 }
 
 TEST_F(View, LevelsWithOddNamesListAsTheFolderEnumeratesThem) {

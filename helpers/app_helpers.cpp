@@ -7,13 +7,14 @@
 #include <vector>
 
 #include "helpers/file_helpers.h"
+#include "marlix_version.h"
 #include "helpers/win_handles.h"
 
 namespace kld::ft {
 
 namespace {
 
-constexpr wchar_t kModuleVersion[] = L"4.0.1";
+constexpr wchar_t kModuleVersion[] = MARLIX_VERSION_WIDE;
 
 // Keeps its last value, so a long path costs the retries once.
 DWORD pathBufferSize = MAX_PATH;

@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # Registers the built DLL with Wine's regsvr32 and checks the registry with Wine's reg.exe.
-# Usage: regsvr32_test.sh <wine-run> <dll>; WINEPREFIX names the test prefix.
+# Usage: regsvr32_test.sh <wine-run> <dll> <type library version>; WINEPREFIX names the test prefix.
 set -u
 run="$1"
 dll="Z:$(printf '%s' "$2" | tr / '\\')"
@@ -35,7 +35,7 @@ expect_line "attributes" "Attributes    REG_BINARY    000000A0" "$folder\\ShellF
 expect_line "namespace" "Marlix Digital Levels" "$namespace\\{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}" /ve
 expect_line "approved" "Marlix Digital Levels" "$approved" /v "{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}"
 expect_line "progid" "MarlixDLShellExt.MarlixDLShellView.1" "$view\\ProgID" /ve
-expect_key 'HKCR\TypeLib\{1C83F5C4-5B89-4449-87FF-E494222081A6}\1.0'
+expect_key "HKCR\\TypeLib\\{1C83F5C4-5B89-4449-87FF-E494222081A6}\\$3"
 
 # A second registration replaces the class keys and writes Attributes anew.
 "$run" reg add "$folder\\Leftover" /f >/dev/null

@@ -8,6 +8,7 @@
 #include "server/class_ids.h"
 #include "server/com_base.h"
 #include "server/registrar.h"
+#include "marlix_version.h"
 #include "base/resource_ids.h"
 #include "server/server_module.h"
 #include "support/registry_sandbox.h"
@@ -141,7 +142,7 @@ TEST_F(ServerModule, RegistrationWritesTheTablesAndReplacesThemWhenRepeated) {
   for (const auto& v : folder) EXPECT_EQ(RegReadString(v.root, v.key, v.value), v.expected) << v.key;
   EXPECT_EQ(ReadAttributes(), kAttributes);
   EXPECT_FALSE(RegKeyExists(kHKCR, L"MarlixDLShellExt.MarlixDLShellFolder"));
-  EXPECT_TRUE(RegKeyExists(kHKCR, kTypeLibKey + L"\\1.0"));
+  EXPECT_TRUE(RegKeyExists(kHKCR, kTypeLibKey + L"\\" MARLIX_TYPELIB_VERSION_WIDE));
   for (const auto& c : kProgIdClasses) {
     std::wstring name = c.name, progId = L"MarlixDLShellExt." + name, key = L"CLSID\\" + std::wstring(c.guid);
     std::pair<std::wstring, std::wstring> values[] = {
@@ -170,7 +171,7 @@ TEST_F(ServerModule, UnregisteringKeepsParentsAndLevels) {
   EXPECT_EQ(server_.UnregisterServer(), S_OK) << "nothing registered yet";
   ASSERT_EQ(server_.RegisterServer(), S_OK);
   EXPECT_EQ(server_.UnregisterServer(), S_OK);
-  std::vector<std::wstring> gone = {kFolderKey, kTypeLibKey + L"\\1.0"};
+  std::vector<std::wstring> gone = {kFolderKey, kTypeLibKey + L"\\" MARLIX_TYPELIB_VERSION_WIDE};
   for (const auto& c : kProgIdClasses) {
     std::wstring progId = L"MarlixDLShellExt." + std::wstring(c.name);
     gone.insert(gone.end(), {progId, progId + L".1", L"CLSID\\" + std::wstring(c.guid)});
@@ -224,7 +225,8 @@ TEST(TypeLibrary, EmbeddedLibraryListsTheClassesAndTheViewInterface) {
   TLIBATTR* attr = nullptr;
   ASSERT_EQ(lib->GetLibAttr(&attr), S_OK);
   EXPECT_TRUE(IsEqualGUID(attr->guid, LIBID_MarlixDLShellExtLib));
-  EXPECT_EQ(std::make_tuple(attr->wMajorVerNum, attr->wMinorVerNum, attr->syskind), std::make_tuple(1, 0, SYS_WIN64));
+  EXPECT_EQ(std::make_tuple(attr->wMajorVerNum, attr->wMinorVerNum, attr->syskind),
+            std::make_tuple(MARLIX_VERSION_MAJOR, MARLIX_VERSION_MINOR, SYS_WIN64));
   lib->ReleaseTLibAttr(attr);
   EXPECT_EQ(Documentation(lib.Get(), -1),
             std::make_pair(std::wstring(L"MarlixDLShellExtLib"), std::wstring(L"MarlixDLShellExt 1.0 Type Library")));

@@ -4,6 +4,8 @@
 #include <climits>
 #include <cwchar>
 
+#include <shlwapi.h>
+
 #include "base/resource_ids.h"
 #include "server/dialog_base.h"
 #include "store/string_table.h"
@@ -14,7 +16,7 @@ constexpr WPARAM kApplyCommand = 12321;  // the platform sheet's Apply button
 
 std::wstring Format(const wchar_t* format, int value) {
   wchar_t text[32] = {};
-  std::swprintf(text, 32, format, value);
+  wnsprintfW(text, 32, format, value);  // Windows' formatter: the C library's would bring a printf
   return text;
 }
 

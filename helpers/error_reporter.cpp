@@ -1,6 +1,8 @@
 #include "helpers/error_reporter.h"
 
 #include <cwchar>
+
+#include <shlwapi.h>
 #include <new>
 #include <vector>
 
@@ -162,7 +164,7 @@ std::wstring BuildErrorText(HRESULT code, const wchar_t* text1, const wchar_t* t
     if (format.empty()) format = L"# %lx";
     std::vector<wchar_t> buffer(format.size() + 64);
     for (;;) {
-      int written = std::swprintf(buffer.data(), buffer.size(), format.c_str(),
+      int written = wnsprintfW(buffer.data(), static_cast<int>(buffer.size()), format.c_str(),
                                   static_cast<unsigned long>(code));
       if (written >= 0) {
         result.assign(buffer.data(), static_cast<size_t>(written));

@@ -5,6 +5,8 @@
 #include <cstring>
 #include <cwchar>
 
+#include <shlwapi.h>
+
 #include "helpers/win_handles.h"
 #include "base/resource_ids.h"
 #include "store/string_table.h"
@@ -12,6 +14,13 @@
 int ColumnWidths[2] = {100, 100};
 
 namespace {
+
+// Windows' formatter: the C library's would bring a whole printf into the module.
+std::wstring DecimalText(int n) {
+  wchar_t text[16] = {};
+  wnsprintfW(text, 16, L"%d", n);
+  return text;
+}
 
 constexpr DWORD kStringReadBytes = 520;  // 260 characters with the terminator
 constexpr DWORD kKeyNameChars = 260;
@@ -200,7 +209,7 @@ HRESULT AddStation(CStationRecord& record) {
   if (OpenLevelsKey(levels) != ERROR_SUCCESS) return E_FAIL;
   // Numbers start at 0 and a freed number is taken again; only a key made by this call is ours.
   for (int n = 0; n < INT_MAX; ++n) {
-    std::wstring name = L"Station " + std::to_wstring(n);
+    std::wstring name = L"Station " + DecimalText(n);
     win::UniqueHKey key;
     DWORD disposition = 0;
     if (RegCreateKeyExW(levels.Get(), name.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, key.Put(), &disposition) !=
@@ -264,7 +273,7 @@ std::wstring MakeUniqueStationName(const std::wstring& base) {
   for (unsigned i = 1;; ++i) {
     CStationRecord probe;
     probe.Name = base;
-    if (i > 1) probe.Name += L" (" + std::to_wstring(i) + L")";
+    if (i > 1) probe.Name += L" (" + DecimalText(i) + L")";
     std::wstring candidate = probe.Name;
     if (FindStation(probe) != S_OK) return candidate;
   }

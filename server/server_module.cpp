@@ -2,6 +2,7 @@
 
 #include <string>
 
+#include "base/boundary.h"
 #include "server/class_factory.h"
 #include "server/class_ids.h"
 #include "server/registrar.h"
@@ -40,7 +41,17 @@ HRESULT CServerModule::GetClassObject(REFCLSID clsid, REFIID riid, void** ppv) c
 
 HRESULT CServerModule::CanUnloadNow() const noexcept { return com::ModuleLockCount() == 0 ? S_OK : S_FALSE; }
 
-HRESULT CServerModule::RegisterServer() const {
+HRESULT CServerModule::RegisterServer() const noexcept {
+  return boundary::Call([this] { return Register(); });
+}
+
+// S_OK in all cases: an uninstaller must be able to go on, memory short or not.
+HRESULT CServerModule::UnregisterServer() const noexcept {
+  boundary::CallVoid([this] { Unregister(); });
+  return S_OK;
+}
+
+HRESULT CServerModule::Register() const {
   if (!module_) return E_UNEXPECTED;
   // The classes register no component categories, so each entry is its script alone.
   for (const auto& entry : map_)
@@ -57,7 +68,7 @@ HRESULT CServerModule::RegisterServer() const {
   return hr;
 }
 
-HRESULT CServerModule::UnregisterServer() const {
+void CServerModule::Unregister() const {
   if (module_) {
     bool failed = false;
     for (const auto& entry : map_)
@@ -76,5 +87,4 @@ HRESULT CServerModule::UnregisterServer() const {
     RegDeleteValueW(key, L"Attributes");
     RegCloseKey(key);
   }
-  return S_OK;
 }

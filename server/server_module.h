@@ -16,10 +16,14 @@ class CServerModule {
 
   HRESULT GetClassObject(REFCLSID clsid, REFIID riid, void** ppv) const;
   HRESULT CanUnloadNow() const noexcept;
-  HRESULT RegisterServer() const;
-  HRESULT UnregisterServer() const;
+  // Registration answers the first failure; unregistration S_OK in all cases.
+  HRESULT RegisterServer() const noexcept;
+  HRESULT UnregisterServer() const noexcept;
 
  private:
+  HRESULT Register() const;
+  void Unregister() const;
+
   GUID libid_{};
   std::span<const ObjectMapEntry> map_;
   HMODULE module_ = nullptr;

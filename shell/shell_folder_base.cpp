@@ -90,9 +90,9 @@ STDMETHODIMP CGravonShellFolderBase::ParseDisplayName(HWND, IBindCtx*, LPWSTR na
     wchar_t folder[MAX_PATH];
     GetFolderPath(folder, MAX_PATH, false);
     std::wstring full = std::wstring(folder) + L'\\' + name;
+    const UINT m = static_cast<UINT>(PathComponents(name).size());
     LPITEMIDLIST list = m_pidlMgr->CreateListFromPath(full.c_str());
     if (!list) return E_INVALIDARG;
-    const UINT m = static_cast<UINT>(PathComponents(name).size());
     const UINT n = m_pidlMgr->GetCount(list);
     HRESULT hr = S_OK;
     if (m < n) {

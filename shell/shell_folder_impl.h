@@ -18,6 +18,8 @@ struct CClassNotAvailable {};
 //   TContextMenu  nothing beyond its interface
 //   TExtractIcon, TQueryInfo, TDropTarget   SetItem(LPCITEMIDLIST fullList), which copies it
 //   TDataObject   AddItem(LPCITEMIDLIST fullList), which copies it
+// SetItem and AddItem answer false when they could not take the list; such an object
+// is never handed out, nor one whose IsUsable() is false.
 template <class TFolder, class TView, class TEnum, class TContextMenu, class TExtractIcon, class TQueryInfo,
           class TDataObject, class TDropTarget>
 class CGravonShellFolderImpl : public CGravonShellFolderBase {
@@ -116,8 +118,16 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
         m_pidlMgr->Free(full);
         return E_OUTOFMEMORY;
       }
-      attach(*object.Get(), full);
+      // An object without its list or its item manager would answer for nothing.
+      bool attached = true;
+      if constexpr (std::is_same_v<decltype(attach(*object.Get(), full)), bool>)
+        attached = attach(*object.Get(), full);
+      else
+        attach(*object.Get(), full);
       m_pidlMgr->Free(full);
+      if (!attached) return E_OUTOFMEMORY;
+      if constexpr (requires { object->IsUsable(); })
+        if (!object->IsUsable()) return E_OUTOFMEMORY;
       return object->QueryInterface(riid, result);
     }
   }

@@ -55,15 +55,17 @@ CMarlixDLDataObject::~CMarlixDLDataObject() {
   if (DragImage) ImageList_Destroy(DragImage);
 }
 
-void CMarlixDLDataObject::AddItem(LPCITEMIDLIST list) {
+bool CMarlixDLDataObject::AddItem(LPCITEMIDLIST list) {
   CPidlMgr pidl;
   LPITEMIDLIST copy = pidl.Copy(list);
-  if (!copy) return;
+  if (!copy) return false;
   try {
     ItemList.push_back(copy);
   } catch (const std::bad_alloc&) {
     pidl.Free(copy);
+    return false;
   }
+  return true;
 }
 
 void CMarlixDLDataObject::SetDragImage(HIMAGELIST image, HWND window, POINT hotSpot) noexcept {

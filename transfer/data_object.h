@@ -13,8 +13,8 @@ class CMarlixDLDataObject : public com::ComObject<IDataObject, IDropSource> {
  public:
   CMarlixDLDataObject() noexcept = default;
 
-  // Keeps a copy of a full item list.
-  void AddItem(LPCITEMIDLIST list);
+  // Keeps a copy of a full item list; false when memory is short.
+  bool AddItem(LPCITEMIDLIST list);
   // Takes the image list over; QueryContinueDrag destroys it.
   void SetDragImage(HIMAGELIST image, HWND window, POINT hotSpot) noexcept;
 

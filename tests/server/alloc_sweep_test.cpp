@@ -1,0 +1,299 @@
+// Allocation failure swept over what the host calls: for every N, the Nth allocation of
+// the call (operator new or the task allocator) fails; no exception may come out, no
+// block may stay behind, and the module must be free to unload afterwards.
+#include <gtest/gtest.h>
+#include <objidl.h>
+#include <shlobj.h>
+
+#include <atomic>
+#include <cstdio>
+#include <cstdlib>
+#include <functional>
+#include <new>
+#include <utility>
+
+#include "server/class_creators.h"
+#include "server/class_ids.h"
+#include "server/com_base.h"
+#include "server/object_map.h"
+#include "server/server_module.h"
+#include "shell/shell_test_util.h"
+#include "store/station_record.h"
+#include "support/registry_sandbox.h"
+#include "transfer/data_object.h"
+
+namespace {
+std::atomic<long> liveBlocks{0};  // operator new blocks not yet deleted
+std::atomic<long> liveTaskBlocks{0};  // task allocator blocks made while the spy was in
+DWORD armedThread = 0;
+long allocations = 0;  // counted on the armed thread
+long failAt = 0;       // 0: none fails
+bool failed = false;
+
+// The row's own inputs are made with counting paused: only the module's calls are swept.
+struct Paused {
+  Paused() : thread(std::exchange(armedThread, 0)) {}
+  ~Paused() { armedThread = thread; }
+  DWORD thread;
+};
+
+bool ShouldFail() noexcept {
+  if (!armedThread || GetCurrentThreadId() != armedThread) return false;
+  if (++allocations != failAt) return false;
+  failed = true;
+  return true;
+}
+
+void* Allocate(size_t size) noexcept {
+  if (ShouldFail()) return nullptr;
+  void* block = std::malloc(size ? size : 1);
+  if (block) ++liveBlocks;
+  return block;
+}
+
+void Release(void* block) noexcept {
+  if (!block) return;
+  --liveBlocks;
+  std::free(block);
+}
+
+// The task allocator, through which item ids and returned strings go.
+class Spy final : public IMallocSpy {
+ public:
+  STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override {
+    if (riid != IID_IUnknown && riid != IID_IMallocSpy) return *ppv = nullptr, E_NOINTERFACE;
+    *ppv = this;
+    return S_OK;
+  }
+  STDMETHODIMP_(ULONG) AddRef() override { return 2; }
+  STDMETHODIMP_(ULONG) Release() override { return 1; }
+  STDMETHODIMP_(SIZE_T) PreAlloc(SIZE_T size) override { return ShouldFail() ? 0 : size; }
+  STDMETHODIMP_(void*) PostAlloc(void* block) override {
+    if (block) ++liveTaskBlocks;
+    return block;
+  }
+  STDMETHODIMP_(void*) PreFree(void* block, BOOL spied) override {
+    if (block && spied) --liveTaskBlocks;
+    return block;
+  }
+  STDMETHODIMP_(void) PostFree(BOOL) override {}
+  STDMETHODIMP_(SIZE_T) PreRealloc(void* block, SIZE_T size, void** out, BOOL) override {
+    *out = block;
+    return size;
+  }
+  STDMETHODIMP_(void*) PostRealloc(void* block, BOOL) override { return block; }
+  STDMETHODIMP_(void*) PreGetSize(void* block, BOOL) override { return block; }
+  STDMETHODIMP_(SIZE_T) PostGetSize(SIZE_T size, BOOL) override { return size; }
+  STDMETHODIMP_(void*) PreDidAlloc(void* block, BOOL) override { return block; }
+  STDMETHODIMP_(int) PostDidAlloc(void*, BOOL, int result) override { return result; }
+  STDMETHODIMP_(void) PreHeapMinimize() override {}
+  STDMETHODIMP_(void) PostHeapMinimize() override {}
+} spy;
+}  // namespace
+
+void* operator new(size_t size) {
+  if (void* block = Allocate(size)) return block;
+  throw std::bad_alloc();
+}
+void* operator new[](size_t size) { return operator new(size); }
+void* operator new(size_t size, const std::nothrow_t&) noexcept { return Allocate(size); }
+void* operator new[](size_t size, const std::nothrow_t&) noexcept { return Allocate(size); }
+void operator delete(void* block) noexcept { Release(block); }
+void operator delete[](void* block) noexcept { Release(block); }
+void operator delete(void* block, size_t) noexcept { Release(block); }
+void operator delete[](void* block, size_t) noexcept { Release(block); }
+void operator delete(void* block, const std::nothrow_t&) noexcept { Release(block); }
+void operator delete[](void* block, const std::nothrow_t&) noexcept { Release(block); }
+
+namespace {
+const wchar_t kStore[] = L"Software\\Gravon\\Shell Extensions\\Marlix DL View\\Levels\\Station ";
+
+// What the host does in one row, releasing everything it got.
+struct Row {
+  const char* name;
+  std::function<void()> run;
+};
+
+UniqueList Id(tagPIDLTYPE type, const wchar_t* text) {
+  Paused paused;
+  return MakeId(type, text);
+}
+
+com::ComPtr<IShellFolder> Root() {
+  com::ComPtr<IShellFolder> root;
+  if (FAILED(CreateMarlixDLShellFolder(IID_IShellFolder, root.PutVoid()))) return nullptr;
+  com::ComPtr<IPersistFolder> persist;
+  if (root.As(&persist) != S_OK || persist->Initialize(nullptr) != S_OK) return nullptr;
+  return root;
+}
+
+void FreeName(STRRET& name) {
+  if (name.uType == STRRET_WSTR) CoTaskMemFree(name.pOleStr);
+}
+
+template <class T>
+void ReleaseOut(T* object) {
+  if (object) object->Release();
+}
+
+void FolderBinding() {
+  auto root = Root();
+  if (!root) return;
+  wchar_t name[] = L"Alpha level\\file1.tkf";
+  LPITEMIDLIST parsed = nullptr;
+  root->ParseDisplayName(nullptr, nullptr, name, nullptr, &parsed, nullptr);
+  CoTaskMemFree(parsed);
+  UniqueList alpha = Id(PIDL_LEVEL, L"Alpha level");
+  IShellFolder* level = nullptr;
+  root->BindToObject(alpha.Get(), nullptr, IID_IShellFolder, reinterpret_cast<void**>(&level));
+  ReleaseOut(level);
+}
+
+void FolderEnumeration() {
+  auto root = Root();
+  if (!root) return;
+  IEnumIDList* list = nullptr;
+  if (root->EnumObjects(nullptr, SHCONTF_FOLDERS | SHCONTF_NONFOLDERS, &list) == S_OK) {
+    LPITEMIDLIST item = nullptr;
+    while (list->Next(1, &item, nullptr) == S_OK) CoTaskMemFree(item);
+    list->Release();
+  }
+}
+
+void FolderAnswers() {
+  auto root = Root();
+  if (!root) return;
+  UniqueList alpha = Id(PIDL_LEVEL, L"Alpha level"), beta = Id(PIDL_LEVEL, L"Beta level");
+  LPCITEMIDLIST items[] = {alpha.Get(), beta.Get()};
+  SFGAOF attributes = SFGAO_VALIDATE;
+  root->GetAttributesOf(2, items, &attributes);
+  root->CompareIDs(0, alpha.Get(), beta.Get());
+  for (DWORD flags : {0x0000, 0x8000, 0x8001}) {
+    STRRET name{};
+    if (root->GetDisplayNameOf(alpha.Get(), flags, &name) == S_OK) FreeName(name);
+  }
+}
+
+void FolderItemObjects() {
+  auto root = Root();
+  if (!root) return;
+  UniqueList alpha = Id(PIDL_LEVEL, L"Alpha level");
+  LPCITEMIDLIST items[] = {alpha.Get()};
+  for (REFIID riid : {IID_IExtractIconW, IID_IQueryInfo, IID_IDataObject, IID_IDropTarget}) {
+    IUnknown* object = nullptr;
+    if (root->GetUIObjectOf(nullptr, 1, items, riid, nullptr, reinterpret_cast<void**>(&object)) != S_OK) continue;
+    IQueryInfo* info = nullptr;
+    IDataObject* data = nullptr;
+    if (object->QueryInterface(IID_IQueryInfo, reinterpret_cast<void**>(&info)) == S_OK) {
+      LPWSTR tip = nullptr;
+      if (info->GetInfoTip(0, &tip) == S_OK) EXPECT_NE(tip[0], L'\0') << "a tip object without its item";
+      CoTaskMemFree(tip);
+      info->Release();
+    }
+    if (object->QueryInterface(IID_IDataObject, reinterpret_cast<void**>(&data)) == S_OK) {
+      FORMATETC request = {static_cast<CLIPFORMAT>(RegisterClipboardFormatW(L"FileGroupDescriptorW")), nullptr,
+                           DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+      STGMEDIUM medium{};
+      HRESULT hr = data->GetData(&request, &medium);
+      EXPECT_NE(hr, S_FALSE) << "a data object without its item";
+      if (hr == S_OK) ReleaseStgMedium(&medium);
+      data->Release();
+    }
+    object->Release();
+  }
+  IUnknown* menu = nullptr;
+  root->CreateViewObject(nullptr, IID_IContextMenu, reinterpret_cast<void**>(&menu));
+  ReleaseOut(menu);
+}
+
+void DataObjectFormats() {
+  auto object = com::Make<CMarlixDLDataObject>();
+  if (!object) return;
+  UniqueList alpha = [] {
+    Paused paused;
+    return MakeFull(L"Marlix Digital Levels\\Alpha level");
+  }();
+  object->AddItem(alpha.Get());
+  object->AddItem(alpha.Get());
+  for (const wchar_t* format : {L"Preferred DropEffect", L"FileGroupDescriptorW", L"Shell IDList Array",
+                                L"Marlix Total Stations", L"FileContents"}) {
+    const bool stream = format[4] == L'C';
+    FORMATETC request = {static_cast<CLIPFORMAT>(RegisterClipboardFormatW(format)), nullptr, DVASPECT_CONTENT, 0,
+                         static_cast<DWORD>(stream ? TYMED_ISTREAM : TYMED_HGLOBAL)};
+    STGMEDIUM medium{};
+    if (object->GetData(&request, &medium) == S_OK) ReleaseStgMedium(&medium);
+    object->QueryGetData(&request);
+  }
+  IEnumFORMATETC* formats = nullptr;
+  if (object->EnumFormatEtc(DATADIR_GET, &formats) == S_OK) {
+    FORMATETC entry;
+    while (formats->Next(1, &entry, nullptr) == S_OK) {
+    }
+    formats->Release();
+  }
+}
+
+void Registration() {
+  CServerModule server;
+  server.SetTypeLibId(LIBID_MarlixDLShellExtLib);
+  server.Init(ModuleObjectMap(), GetModuleHandleW(nullptr));
+  server.RegisterServer();
+  server.UnregisterServer();
+}
+
+const Row kRows[] = {
+    {"folder: initialize, parse and bind", FolderBinding},
+    {"folder: enumeration", FolderEnumeration},
+    {"folder: attributes, comparison and names", FolderAnswers},
+    {"folder: item objects, tip and menu", FolderItemObjects},
+    {"data object: every format and the format list", DataObjectFormats},
+    {"registration and unregistration", Registration},
+    // The view's creation joins here as one more row.
+};
+
+class AllocationSweep : public testing::TestWithParam<Row> {
+ protected:
+  static void SetUpTestSuite() { ASSERT_EQ(CoRegisterMallocSpy(&spy), S_OK); }
+  static void TearDownTestSuite() { CoRevokeMallocSpy(); }
+  RegistrySandbox sandbox_{{HKEY_CLASSES_ROOT, HKEY_LOCAL_MACHINE, HKEY_CURRENT_USER}};
+};
+
+// Runs the row with the Nth allocation failing; false once a run met no failure.
+bool RunFailing(const Row& row, long n) {
+  allocations = 0;
+  failAt = n;
+  failed = false;
+  armedThread = GetCurrentThreadId();
+  try {
+    row.run();
+  } catch (...) {
+    armedThread = 0;
+    ADD_FAILURE() << "an exception came out with allocation " << n << " failing";
+    return false;
+  }
+  armedThread = 0;
+  return failed;
+}
+
+TEST_P(AllocationSweep, NoExceptionNoLeakAndTheModuleUnloads) {
+  const Row& row = GetParam();
+  for (int n : {0, 1})
+    RegWriteString(HKEY_CURRENT_USER, kStore + std::to_wstring(n), L"Name", n ? L"Beta level" : L"Alpha level");
+  row.run();  // first-use state of the process is made once, outside the count
+  long swept = 0;
+  for (long n = 1;; ++n) {
+    const long blocks = liveBlocks, taskBlocks = liveTaskBlocks;
+    const bool more = RunFailing(row, n);
+    EXPECT_EQ(liveBlocks - blocks, 0) << "with allocation " << n << " failing";
+    EXPECT_EQ(liveTaskBlocks - taskBlocks, 0) << "task allocator, with allocation " << n << " failing";
+    EXPECT_EQ(com::ModuleLockCount(), 0) << "with allocation " << n << " failing";
+    if (!more || HasFailure()) break;
+    swept = n;
+  }
+  std::printf("[ swept    ] %s: %ld allocations\n", row.name, swept);
+  EXPECT_GT(swept, 0);
+}
+
+INSTANTIATE_TEST_SUITE_P(Rows, AllocationSweep, testing::ValuesIn(kRows),
+                         [](const testing::TestParamInfo<Row>& info) { return "Row" + std::to_string(info.index); });
+}  // namespace

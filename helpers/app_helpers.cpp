@@ -19,7 +19,6 @@ constexpr wchar_t kModuleVersion[] = MARLIX_VERSION_WIDE;
 // Keeps its last value, so a long path costs the retries once.
 DWORD pathBufferSize = MAX_PATH;
 
-const std::wstring appName = AppNameOfExecutable(GetExecutablePath());
 
 // A plain flag: the callers are the threads that show windows.
 bool appPathKnown = false;
@@ -88,9 +87,14 @@ std::wstring AppVersionFor(const std::wstring& name) {
   return kModuleVersion;
 }
 
-std::wstring GetAppNameW() { return appName; }
+// Read at the first question, not while the module loads: the host's version block must
+// not be read under the loader lock. The guard of a local static makes it race-free.
+std::wstring GetAppNameW() {
+  static const std::wstring appName = AppNameOfExecutable(GetExecutablePath());
+  return appName;
+}
 
-std::wstring GetAppVersionW() { return AppVersionFor(appName); }
+std::wstring GetAppVersionW() { return AppVersionFor(GetAppNameW()); }
 
 std::wstring GetAppPathW() {
   if (!appPathKnown) {

@@ -134,11 +134,13 @@ std::wstring TStdErrorReporter::GetErrorText(HRESULT code, const wchar_t* text1,
 std::wstring TInternetErrorReporter::GetErrorText(HRESULT code, const wchar_t*, const wchar_t*,
                                                   const wchar_t*) const {
   // Only asked when someone else has loaded the library; it is never loaded for this.
-  HMODULE wininet = GetModuleHandleW(L"wininet.dll");
-  if (!wininet) return {};
+  // The reference taken here keeps it in the process while its table is read.
+  HMODULE wininet = nullptr;
+  if (!GetModuleHandleExW(0, L"wininet.dll", &wininet) || !wininet) return {};
   wchar_t* buffer = nullptr;
   DWORD length = FormatMessageW(0x0B00, wininet, static_cast<DWORD>(code) & 0x7FF8FFFF, 0,
                                 reinterpret_cast<LPWSTR>(&buffer), 0, nullptr);
+  FreeLibrary(wininet);
   if (length == 0) {
     if (buffer) LocalFree(buffer);
     return {};

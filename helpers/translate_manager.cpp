@@ -18,12 +18,18 @@ bool managerCreated = false;
 std::unique_ptr<CTranslateFileManager> manager;
 // Every Explorer window has a thread of its own, and several may open at once: the
 // maps are guarded. A loaded file is never changed, so lookups in it need no lock.
+// Only the maps are: probing the disk, making folders and mapping a file happen outside,
+// so one slow or dead path holds up nobody else.
 SRWLOCK managerLock = SRWLOCK_INIT;
 
 class ExclusiveLock {
  public:
-  explicit ExclusiveLock(SRWLOCK* lock) : lock_(lock) { AcquireSRWLockExclusive(lock_); }
-  ~ExclusiveLock() { ReleaseSRWLockExclusive(lock_); }
+  explicit ExclusiveLock(SRWLOCK* lock) : lock_(lock) {
+    if (lock_) AcquireSRWLockExclusive(lock_);
+  }
+  ~ExclusiveLock() {
+    if (lock_) ReleaseSRWLockExclusive(lock_);
+  }
   ExclusiveLock(const ExclusiveLock&) = delete;
   ExclusiveLock& operator=(const ExclusiveLock&) = delete;
 
@@ -45,8 +51,13 @@ std::wstring ModuleTitle(HMODULE module) {
 
 }  // namespace
 
+namespace test_only {
+void (*TranslateProbeHook)() = nullptr;
+}
+
 std::wstring FindTranslateFilePath(const CTranslateFileKey& key) {
   if (key.sourceLanguage != kEnglish) return {};
+  if (test_only::TranslateProbeHook) test_only::TranslateProbeHook();
   const std::wstring root = GetLanguagesRootDirW(GetAppNameW().c_str());
   wchar_t locale[85] = {};
   if (!LCIDToLocaleName(key.targetLanguage, locale, 85, 0)) locale[0] = L'\0';
@@ -65,24 +76,32 @@ std::wstring FindTranslateFilePath(const CTranslateFileKey& key) {
 
 std::shared_ptr<CTranslateFile> GetTranslateFile(CTranslateFileManager& files, HMODULE module,
                                                  LANGID sourceLanguage, LANGID targetLanguage,
-                                                 const wchar_t* name) {
+                                                 const wchar_t* name, SRWLOCK* mapsLock) {
   CTranslateFileKey key{sourceLanguage, targetLanguage, name ? name : ModuleTitle(module)};
   std::wstring path;
-  auto known = files.knownPaths.find(key);
-  if (known != files.knownPaths.end()) {
-    path = known->second;
-  } else {
+  {
+    ExclusiveLock lock(mapsLock);
+    auto known = files.knownPaths.find(key);
+    if (known != files.knownPaths.end()) path = known->second;
+  }
+  if (path.empty()) {
     if (sourceLanguage == targetLanguage) return nullptr;
     path = FindTranslateFilePath(key);
     if (path.empty()) return nullptr;
-    files.knownPaths.emplace(key, path);
+    ExclusiveLock lock(mapsLock);
+    // A thread that found a path first has fixed it for the name.
+    path = files.knownPaths.emplace(key, path).first->second;
   }
-  auto loaded = files.loadedFiles.find(path);
-  if (loaded != files.loadedFiles.end()) return loaded->second;
+  {
+    ExclusiveLock lock(mapsLock);
+    auto loaded = files.loadedFiles.find(path);
+    if (loaded != files.loadedFiles.end()) return loaded->second;
+  }
   auto file = std::make_shared<CTranslateFile>();
   if (FAILED(file->Load(path.c_str()))) return nullptr;
-  files.loadedFiles.emplace(path, file);
-  return file;
+  ExclusiveLock lock(mapsLock);
+  // Two threads may have loaded it at once: the first one stored is the one kept.
+  return files.loadedFiles.emplace(path, file).first->second;
 }
 
 std::wstring TranslateText(const std::wstring& text, LANGID sourceLanguage, LANGID targetLanguage,
@@ -95,15 +114,15 @@ std::wstring TranslateText(const std::wstring& text, LANGID sourceLanguage, LANG
     reverse = true;
   }
   try {
-    std::shared_ptr<CTranslateFile> file;
     {
       ExclusiveLock lock(&managerLock);
       if (!managerCreated) {
         manager = std::make_unique<CTranslateFileManager>();
         managerCreated = true;
       }
-      file = GetTranslateFile(*manager, module, sourceLanguage, targetLanguage, name);
     }
+    std::shared_ptr<CTranslateFile> file =
+        GetTranslateFile(*manager, module, sourceLanguage, targetLanguage, name, &managerLock);
     if (file) {
       std::wstring translated = file->Find(text, reverse);
       if (!translated.empty()) return translated;

@@ -31,14 +31,20 @@ struct CTranslateFileManager {
 std::wstring FindTranslateFilePath(const CTranslateFileKey& key);
 
 // The file for the module (or `name`), loaded once; null when there is none.
+// `mapsLock`, if given, is held around each use of the maps and nowhere else.
 std::shared_ptr<CTranslateFile> GetTranslateFile(CTranslateFileManager& manager, HMODULE module,
                                                  LANGID sourceLanguage, LANGID targetLanguage,
-                                                 const wchar_t* name);
+                                                 const wchar_t* name, SRWLOCK* mapsLock = nullptr);
 
 // `text` in the target language; at worst `text` cut at its first "#$". Any thread may
 // call it; GetTranslateFile on a manager of one's own needs the caller's own care.
 std::wstring TranslateText(const std::wstring& text, LANGID sourceLanguage, LANGID targetLanguage,
                            HMODULE module, const wchar_t* name);
+
+namespace test_only {
+// Called as the probing for a file begins.
+extern void (*TranslateProbeHook)();
+}  // namespace test_only
 
 // The process-wide manager, or null before the first real translation.
 CTranslateFileManager* TranslateFileManagerIfCreated() noexcept;

@@ -11,8 +11,8 @@ STDMETHODIMP CClassFactory::CreateInstance(IUnknown* outer, REFIID riid, void** 
 
 STDMETHODIMP CClassFactory::LockServer(BOOL lock) {
   if (lock)
-    com::LockModule();
+    com::LockServer();
   else
-    com::UnlockModule();
+    com::UnlockServer();
   return S_OK;
 }

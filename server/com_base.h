@@ -13,6 +13,10 @@ namespace com {
 void LockModule() noexcept;
 void UnlockModule() noexcept;
 long ModuleLockCount() noexcept;
+// IClassFactory::LockServer: an unlock without a lock of its own changes nothing, so a
+// client's extra LockServer(FALSE) can't take the count below zero.
+void LockServer() noexcept;
+void UnlockServer() noexcept;
 
 // Owning interface pointer. Construction from a raw pointer adds a reference;
 // Attach takes one over.

@@ -74,7 +74,6 @@ const wchar_t kRootText[] = L"Marlix Digital Levels";
 const wchar_t kFileText[] = L"file1.tkf";
 constexpr DWORD kFolders = 0x20;     // SHCONTF_FOLDERS
 constexpr DWORD kNonFolders = 0x40;  // SHCONTF_NONFOLDERS
-constexpr DWORD kNameBytes = 520;
 }  // namespace
 
 CMarlixDLEnumIDList::CMarlixDLEnumIDList() : CEnumIDListImpl(new (std::nothrow) CPidlMgr) {
@@ -126,13 +125,9 @@ HRESULT CMarlixDLEnumIDList::AddLevels(const std::wstring& path) {
       break;
     win::UniqueHKey level;
     if (RegOpenKeyExW(levels.Get(), keyName, 0, KEY_READ, level.Put()) != ERROR_SUCCESS) continue;
-    // One spare character so that a value stored without terminator still ends inside the buffer.
-    wchar_t name[kNameBytes / sizeof(wchar_t) + 1];
-    DWORD size = kNameBytes;
-    if (RegQueryValueExW(level.Get(), L"Name", nullptr, nullptr, reinterpret_cast<BYTE*>(name), &size) !=
-        ERROR_SUCCESS)
-      continue;
-    name[size / sizeof(wchar_t)] = 0;
+    // Read as the store reads it, so that every listed level can be found again by name.
+    std::wstring name;
+    if (ReadStationString(level.Get(), L"Name", name) != ERROR_SUCCESS) continue;
     std::wstring itemPath = path + L'\\' + name;
     LPITEMIDLIST item = m_marlixPidlMgr->CreateItemFromPath(itemPath.c_str());
     if (!item) continue;

@@ -15,7 +15,8 @@ enum ItemImage : int {
 extern HIMAGELIST LargeImageList;
 extern HIMAGELIST SmallImageList;
 
-// Module start: (re)builds both lists from icons 101, 102, 104 of the module.
-void LoadImageLists();
+// Module start: (re)builds both lists from icons 101, 102, 104 of `module` (null: this
+// module's own).
+void LoadImageLists(HINSTANCE module = nullptr);
 // Module end.
 void DestroyImageLists();

@@ -36,7 +36,8 @@ HRESULT CreateNotifyWindow(NotifyWindowPair& pair, HWND viewWindow) {
     wc.hCursor = LoadCursorW(nullptr, IDC_ARROW);
     wc.hbrBackground = reinterpret_cast<HBRUSH>(COLOR_WINDOW + 1);
     wc.lpszClassName = kNotifyWindowClass;
-    if (!RegisterClassW(&wc)) return E_FAIL;
+    // Another thread may have registered it meanwhile; that is as good.
+    if (!RegisterClassW(&wc) && GetLastError() != ERROR_CLASS_ALREADY_EXISTS) return E_FAIL;
   }
   HWND hidden = CreateWindowExW(0, kNotifyWindowClass, nullptr, 0, 0, 0, 0, 0, nullptr, nullptr,
                                 module, &pair);
@@ -47,6 +48,11 @@ HRESULT CreateNotifyWindow(NotifyWindowPair& pair, HWND viewWindow) {
 }
 
 void DestroyNotifyWindow(NotifyWindowPair& pair) {
-  if (IsWindow(pair.Hidden)) DestroyWindow(pair.Hidden);
+  // Cut the window from the pair first: should the window outlive this call (destroyed
+  // from a thread that doesn't own it), it must not reach a pair that is freed.
+  if (IsWindow(pair.Hidden)) {
+    SetWindowLongPtrW(pair.Hidden, GWLP_USERDATA, 0);
+    DestroyWindow(pair.Hidden);
+  }
   pair.Hidden = nullptr;
 }

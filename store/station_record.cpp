@@ -30,7 +30,9 @@ LONG OpenLevelsKey(win::UniqueHKey& key) {
                          key.Put(), nullptr);
 }
 
-LONG ReadString(HKEY key, const wchar_t* value, std::wstring& out) {
+}  // namespace
+
+LONG ReadStationString(HKEY key, const wchar_t* value, std::wstring& out) {
   // One spare character so that a value stored without its terminator still ends.
   wchar_t buffer[kStringReadBytes / sizeof(wchar_t) + 1] = {};
   DWORD size = kStringReadBytes;
@@ -39,6 +41,10 @@ LONG ReadString(HKEY key, const wchar_t* value, std::wstring& out) {
   out.assign(buffer, wcsnlen(buffer, (size + 1) / sizeof(wchar_t)));
   return ERROR_SUCCESS;
 }
+
+namespace {
+
+LONG ReadString(HKEY key, const wchar_t* value, std::wstring& out) { return ReadStationString(key, value, out); }
 
 LONG ReadNumber(HKEY key, const wchar_t* value, int& out) {
   DWORD number = 0, size = sizeof(number);
@@ -208,14 +214,16 @@ HRESULT AddStation(CStationRecord& record) {
   win::UniqueHKey levels;
   if (OpenLevelsKey(levels) != ERROR_SUCCESS) return E_FAIL;
   // Numbers start at 0 and a freed number is taken again; only a key made by this call is ours.
+  // Any failure but "that key exists" ends the search: a deleted Levels key or a full
+  // hive would otherwise hold the caller's thread for 2^31 calls.
   for (int n = 0; n < INT_MAX; ++n) {
     std::wstring name = L"Station " + DecimalText(n);
     win::UniqueHKey key;
     DWORD disposition = 0;
     if (RegCreateKeyExW(levels.Get(), name.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, key.Put(), &disposition) !=
-            ERROR_SUCCESS ||
-        disposition != REG_CREATED_NEW_KEY)
-      continue;
+        ERROR_SUCCESS)
+      return E_FAIL;
+    if (disposition != REG_CREATED_NEW_KEY) continue;
     WriteStation(record, key.Get());
     return S_OK;
   }

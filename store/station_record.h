@@ -38,6 +38,10 @@ void WriteStation(const CStationRecord& record, HKEY key);
 
 // Finds a level by exact name and fills `record` from the store. With a buffer and a
 // non-zero *keyNameLength, also gives the level's key name and sets the length to its length + 1.
+// A string value as every reader of the store takes it: at most 520 bytes, an odd last
+// byte kept as a character of its own, and no terminator needed.
+LONG ReadStationString(HKEY key, const wchar_t* value, std::wstring& out);
+
 HRESULT FindStation(CStationRecord& record, wchar_t* keyName = nullptr, DWORD* keyNameLength = nullptr);
 // E_INVALIDARG if the name is taken, in which case `record` now holds the stored level.
 HRESULT AddStation(CStationRecord& record);

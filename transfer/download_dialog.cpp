@@ -91,6 +91,11 @@ bool CDownloadProgressDialog::StartTransfer() {
   }
   Comm->Initialize();
   Comm->SetCallback(&CommResultCallback);
+  // The library may call back after the dialog, and every object of ours, is gone: the
+  // code it calls must stay in the process for good.
+  HMODULE self = nullptr;
+  GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_PIN | GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS,
+                     reinterpret_cast<LPCWSTR>(&CommResultCallback), &self);
 
   char narrowPath[MAX_PATH] = {};
   WideCharToMultiByte(CP_THREAD_ACP, 0, TargetPath.c_str(), -1, narrowPath, MAX_PATH, nullptr,

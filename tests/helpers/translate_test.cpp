@@ -101,17 +101,15 @@ TEST(TranslateFile, LoadRefusesAnythingButUtf16WithMarkAndTakesHugeFiles) {
   // A stray last byte is no character and is never read.
   EXPECT_EQ(LoadBytes(testfiles::Utf16File(L"[k]\n[v]") + "\x5D", &file), S_OK);
   EXPECT_EQ(file.Find(L"k", false), L"v");
-  // A huge file is parsed in one pass.
-  const std::wstring path = testfiles::TempDirectory() + L"marlix_tf_huge.txt";
-  // One line of 100 MB with no closing bracket between two pairs.
-  testfiles::WriteTranslation(path, L"[big]\r\n[groß]\r\n[" + std::wstring(50 << 20, L'x') +
-                                        L"\r\n[end]\r\n[ende]");
-  CTranslateFile huge;
-  EXPECT_EQ(huge.Load(path.c_str()), S_OK);
-  DeleteFileW(path.c_str());
-  EXPECT_EQ(huge.Find(L"big", false), L"groß");
-  EXPECT_EQ(huge.Find(L"end", false), L"ende");
-  EXPECT_EQ(huge.Size(), 2u);
+}
+
+// Lines longer than any 16-bit count: no limit on a line, neither kept nor skipped.
+TEST(TranslateFile, LinesHaveNoLengthLimit) {
+  const std::wstring longText(70000, L'x');
+  const CTranslateFile file = Parsed(L"[big]\r\n[groß]\r\n[" + longText + L"\r\n[" + longText + L"]\n[long]\n");
+  EXPECT_EQ(file.Find(L"big", false), L"groß");
+  EXPECT_EQ(file.Find(longText, false), L"long");
+  EXPECT_EQ(file.Size(), 2u);
 }
 
 TEST(TranslateFile, RandomMutationsNeverReadPastTheEnd) {
@@ -192,6 +190,36 @@ TEST_F(TranslationFiles, TranslateTextFallsBackToTheCutEnglishText) {
   for (const auto& r : rows)
     EXPECT_EQ(TranslateText(r.text, r.from, r.to, ModuleInstance(), r.name), r.result) << r.text << r.to;
   EXPECT_NE(TranslateFileManagerIfCreated(), nullptr);
+}
+
+// One thread probing a slow path holds up no other thread's translation.
+TEST_F(TranslationFiles, ProbingIsOutsideTheLock) {
+  Write(L"de-DE\\quick.txt", L"[Start]\n[Starten]\n");
+  ASSERT_EQ(TranslateText(L"Start", kEnglish, kGerman, ModuleInstance(), L"quick"), L"Starten");
+  static HANDLE entered, release;
+  static DWORD slowThread;
+  static std::atomic<bool> probing;
+  entered = CreateEventW(nullptr, TRUE, FALSE, nullptr);
+  release = CreateEventW(nullptr, TRUE, FALSE, nullptr);
+  test_only::TranslateProbeHook = [] {
+    if (GetCurrentThreadId() != slowThread) return;
+    probing = true;
+    SetEvent(entered);
+    WaitForSingleObject(release, 5000);
+    probing = false;
+  };
+  std::thread slow([] {
+    slowThread = GetCurrentThreadId();
+    TranslateText(L"Start", kEnglish, kGerman, ModuleInstance(), L"slow");
+  });
+  ASSERT_EQ(WaitForSingleObject(entered, 5000), WAIT_OBJECT_0);
+  EXPECT_EQ(TranslateText(L"Start", kEnglish, kGerman, ModuleInstance(), L"quick"), L"Starten");
+  EXPECT_TRUE(probing) << "the second thread waited for the first one's probing";
+  SetEvent(release);
+  slow.join();
+  test_only::TranslateProbeHook = nullptr;
+  CloseHandle(entered);
+  CloseHandle(release);
 }
 
 TEST_F(TranslationFiles, ThreadsTranslatingAtOnceShareOneFile) {

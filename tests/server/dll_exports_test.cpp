@@ -78,6 +78,8 @@ TEST_F(DllExports, LockServerHoldsTheModuleAndImageListsAreBuiltAtLoad) {
   factory.Reset();
   EXPECT_EQ(dll_.canUnloadNow(), S_OK);
   ASSERT_EQ(dll_.getClassObject(CLSID_MarlixDLExtractIcon, IID_IClassFactory, factory.PutVoid()), S_OK);
+  EXPECT_EQ(factory->LockServer(FALSE), S_OK);
+  EXPECT_EQ(dll_.canUnloadNow(), S_FALSE) << "an unlock without a lock took away the class object's hold";
   com::ComPtr<IExtractIconW> icon;
   ASSERT_EQ(factory->CreateInstance(nullptr, IID_IExtractIconW, icon.PutVoid()), S_OK);
   for (UINT index : {0u, 1u, 2u}) {

@@ -1,7 +1,11 @@
 #include <gtest/gtest.h>
 #include <atomic>
+#include <cstdlib>
+#include <functional>
 #include <cstring>
 #include <thread>
+#include "base/module_instance.h"
+#include "base/resource_ids.h"
 #include "server/class_creators.h"
 #include "server/class_ids.h"
 #include "shell/context_menu.h"
@@ -21,6 +25,42 @@ std::wstring Path(IShellFolder* folder, bool parsing) {
 }
 
 const wchar_t kRoot[] = L"\\Marlix Digital Levels";
+
+// The pixels of a square drawn on white.
+std::vector<DWORD> Pixels(int size, const std::function<void(HDC)>& draw) {
+  BITMAPINFO info{{sizeof(BITMAPINFOHEADER), size, -size, 1, 32, BI_RGB}};
+  void* bits = nullptr;
+  HDC dc = CreateCompatibleDC(nullptr);
+  HBITMAP dib = CreateDIBSection(dc, &info, DIB_RGB_COLORS, &bits, nullptr, 0);
+  HGDIOBJ old = SelectObject(dc, dib);
+  RECT all{0, 0, size, size};
+  FillRect(dc, &all, static_cast<HBRUSH>(GetStockObject(WHITE_BRUSH)));
+  draw(dc);
+  GdiFlush();
+  std::vector<DWORD> pixels(static_cast<DWORD*>(bits), static_cast<DWORD*>(bits) + size * size);
+  SelectObject(dc, old);
+  DeleteObject(dib);
+  DeleteDC(dc);
+  return pixels;
+}
+
+const int kIconOrder[] = {IDI_LEVEL, IDI_ADD_LEVEL, IDI_VIRTUAL_FILE};
+
+// Which of the three icons of the module looks most like `pixels`.
+int NearestIcon(const std::vector<DWORD>& pixels, int size) {
+  int nearest = 0;
+  long long best = -1;
+  for (int id : kIconOrder) {
+    HICON icon = static_cast<HICON>(LoadImageW(ModuleInstance(), MAKEINTRESOURCEW(id), IMAGE_ICON, size, size, 0));
+    const auto drawn = Pixels(size, [&](HDC dc) { DrawIconEx(dc, 0, 0, icon, size, size, 0, nullptr, DI_NORMAL); });
+    DestroyIcon(icon);
+    long long distance = 0;
+    for (size_t i = 0; i < pixels.size(); ++i)
+      for (int shift : {0, 8, 16}) distance += std::abs(int((pixels[i] >> shift) & 0xFF) - int((drawn[i] >> shift) & 0xFF));
+    if (best < 0 || distance < best) best = distance, nearest = id;
+  }
+  return nearest;
+}
 using Texts = std::vector<std::wstring>;
 
 // An enumerator; null if Create failed (the object is gone then).
@@ -219,7 +259,10 @@ TEST_F(Shell, EnumeratorOverNoStoreOddNamesAndPathsWithoutComponents) {
   win::UniqueHKey level(raw);
   ASSERT_EQ(RegSetValueExW(raw, L"Name", 0, REG_SZ, reinterpret_cast<const BYTE*>(full.data()), 518), ERROR_SUCCESS);
   SeedLevel(1, std::wstring(300, L'x'));
-  EXPECT_EQ(Walk(Enumerate(kRoot, SHCONTF_FOLDERS).Get()), Texts{L"2:" + full});
+  // An odd size lists as the store reads it, so the level can be found by what is listed.
+  ASSERT_EQ(RegSetKeyValueW(HKEY_CURRENT_USER, (GetLevelsKeyName() + L"\\Station 2").c_str(), L"Name", REG_BINARY,
+                            L"odd!", 5), ERROR_SUCCESS);
+  EXPECT_EQ(Walk(Enumerate(kRoot, SHCONTF_FOLDERS).Get()), (Texts{L"2:" + full, L"2:odd"}));
 }
 
 TEST_F(Shell, EnumeratorNextSkipResetCloneAsTheShellExpects) {
@@ -265,6 +308,19 @@ TEST_F(Shell, ImageListsHoldThreePicturesAtBothSizesAndIconsComeFromThem) {
     ImageList_GetIconSize(list, &cx, &cy);
     EXPECT_EQ(std::make_pair(cx, cy), std::make_pair(GetSystemMetrics(x), GetSystemMetrics(y)));
   }
+  // Each place holds its own picture: the icon nearest to each entry is the one meant for it.
+  for (auto [list, x] : {std::pair{LargeImageList, SM_CXICON}, std::pair{SmallImageList, SM_CXSMICON}}) {
+    const int size = GetSystemMetrics(x);
+    for (int place = 0; place < 3; ++place) {
+      const auto entry = Pixels(size, [&](HDC dc) { ImageList_Draw(list, place, dc, 0, 0, ILD_NORMAL); });
+      EXPECT_EQ(NearestIcon(entry, size), kIconOrder[place]) << "size " << size << ", place " << place;
+    }
+  }
+  // A picture that can't be loaded keeps its place: the indexes never shift.
+  LoadImageLists(GetModuleHandleW(L"kernel32.dll"));
+  EXPECT_EQ(ImageList_GetImageCount(LargeImageList), 3);
+  EXPECT_EQ(ImageList_GetImageCount(SmallImageList), 3);
+  LoadImageLists();
   // The index follows the last id; a relative list has no parent id.
   auto icon = com::Make<CMarlixDLExtractIcon>();
   struct Row { UniqueList list; int index; } rows[] = {

@@ -165,6 +165,22 @@ TEST_F(Store, DefaultsAndAStoreThatCannotBeReached) {
   EXPECT_EQ(std::make_tuple(find, add, saved, loaded), std::make_tuple(E_FAIL, E_FAIL, false, false))
       << "with the user's root on a deleted key nothing below it can be made";
 }
+// A Levels key that takes no lasting child: every creation fails, and Add must give up.
+TEST_F(Store, AddGivesUpOnAFailureOtherThanAnExistingKey) {
+  HKEY levels = nullptr;
+  ASSERT_EQ(RegCreateKeyExW(kUser, kLevels.c_str(), 0, nullptr, REG_OPTION_VOLATILE, KEY_ALL_ACCESS, nullptr, &levels,
+                            nullptr), ERROR_SUCCESS);
+  RegCloseKey(levels);
+  static HRESULT added;
+  added = E_PENDING;
+  HANDLE adding = CreateThread(nullptr, 0, [](void*) -> DWORD { return added = Add(L"new"), 0; }, nullptr, 0, nullptr);
+  const bool ended = WaitForSingleObject(adding, 10000) == WAIT_OBJECT_0;
+  if (!ended) TerminateThread(adding, 0);
+  CloseHandle(adding);
+  EXPECT_TRUE(ended) << "AddStation went on trying";
+  EXPECT_EQ(added, E_FAIL);
+}
+
 TEST_F(Store, AddWritesEveryValueAndFindReadsThemBack) {
   CStationRecord added = Full(L"Level one", 10);
   ASSERT_EQ(AddStation(added), S_OK);

@@ -2,7 +2,11 @@
 // the temporary target path) and the registered messages that carry changes among views.
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <climits>
+#include <filesystem>
+#include <fstream>
+#include <thread>
 #include <utility>
 #include <vector>
 
@@ -93,6 +97,32 @@ LRESULT CALLBACK ViewProc(HWND window, UINT message, WPARAM wParam, LPARAM lPara
   return DefWindowProcW(window, message, wParam, lParam);
 }
 
+// The stand-in honours the contract: each started transfer calls back, and Destroy
+// waits for the library's own thread before anything is freed.
+std::atomic<int> callbacks{0};
+TEST(StandIn, EveryReceiveFileCallsBack) {
+  wchar_t self[MAX_PATH] = {};
+  GetModuleFileNameW(nullptr, self, MAX_PATH);
+  std::wstring folder(self, wcsrchr(self, L'\\') + 1);
+  std::ofstream(std::filesystem::path(folder + L"MarlixComm.txt"), std::ios::binary) << "delay_ms=50\n";
+  std::wstring error;
+  IMarlixComm* comm = CreateCommObject(error);
+  ASSERT_TRUE(comm) << testing::PrintToString(error);
+  comm->SetCallback([](int) { ++callbacks; });
+  char temp[MAX_PATH] = {}, target[MAX_PATH] = {};
+  GetTempPathA(MAX_PATH, temp);
+  GetTempFileNameA(temp, "TKF", 0, target);
+  comm->SetFilePath(target);
+  EXPECT_EQ(comm->ReceiveFile(20, true), 0);
+  EXPECT_EQ(comm->ReceiveFile(20, true), 0);
+  for (ULONGLONG end = GetTickCount64() + 5000; callbacks < 2 && GetTickCount64() < end;) Sleep(10);
+  comm->Destroy(1);
+  EXPECT_EQ(callbacks.load(), 2);
+  DeleteFileA(target);
+  DeleteFileA((std::string(target) + ".txt").c_str());
+  DeleteFileW((folder + L"MarlixComm.txt").c_str());
+}
+
 TEST(ViewNotify, MessagesKeepTheirTextsAndABroadcastReachesEveryViewThroughItsHiddenWindow) {
   EXPECT_EQ(GlobalNotifyMessage, RegisterWindowMessageW(L"TSShell Extension - Global Notify"));
   EXPECT_EQ(DownloadMessage, RegisterWindowMessageW(L"Marlix Total Stations Shell Extension - Download Message"));
@@ -124,11 +154,23 @@ TEST(ViewNotify, MessagesKeepTheirTextsAndABroadcastReachesEveryViewThroughItsHi
     EXPECT_EQ(view.wParam, 1u);
     EXPECT_EQ(view.lParam, 2);
   }
+  // The window lets go of its pair before it is destroyed, so it can never outlive the pair holding it.
+  static HWND watched;
+  static LONG_PTR pairAtDestroy;
+  watched = pairs[1].Hidden;
+  pairAtDestroy = -1;
+  HHOOK hook = SetWindowsHookExW(WH_CALLWNDPROC, [](int code, WPARAM w, LPARAM l) -> LRESULT {
+    auto* call = reinterpret_cast<CWPSTRUCT*>(l);
+    if (call->hwnd == watched && call->message == WM_DESTROY) pairAtDestroy = GetWindowLongPtrW(watched, GWLP_USERDATA);
+    return CallNextHookEx(nullptr, code, w, l);
+  }, nullptr, GetCurrentThreadId());
+  DestroyNotifyWindow(pairs[1]);
+  UnhookWindowsHookEx(hook);
+  EXPECT_EQ(pairAtDestroy, 0);
   HWND hidden = pairs[0].Hidden;
   DestroyNotifyWindow(pairs[0]);
   EXPECT_FALSE(IsWindow(hidden));
   DestroyNotifyWindow(pairs[0]);  // a second time is harmless
-  DestroyNotifyWindow(pairs[1]);
   for (HWND view : views) DestroyWindow(view);
 }
 

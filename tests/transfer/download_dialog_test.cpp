@@ -112,7 +112,7 @@ class DownloadDialogTest : public testing::Test {
   static CStationRecord Level(const wchar_t* model = L"HRA20") {
     CStationRecord level;  // values that show a crossing of stop bits and parity, or of data bits and flow
     level.Name = L"North \"benchmark\" \\ line";
-    level.Port = 3, level.BaudRate = 19200, level.StopBits = 1, level.Parity = 2;
+    level.Port = 3, level.BaudRate = 19200, level.StopBits = 15, level.Parity = 2;
     level.DataBits = 7, level.Flow = 1, level.CheckSum = 0, level.Model = model;
     return level;
   }
@@ -139,7 +139,7 @@ TEST_F(DownloadDialogTest, FullDownloadShowsItsTextsRunsTheContractInOrderAndEnd
   const std::vector<std::string> expected = {
       "CreateInstance", "Initialize", "SetCallback set", std::string("SetFilePath ") + narrowTarget,
       "SetTimeout 30", "SetPoints preset=10000",
-      "SetCommParameters 3 19200 2 1 1 7 0",  // parity before stop bits, flow before data bits
+      "SetCommParameters 3 19200 2 15 1 7 0",  // parity before stop bits, flow before data bits
       "ReceiveFile 20 true", "Wrote 5000 bytes", "Callback 0", "Destroy 1 points=intact", "FreePoints preset=10000"};
   EXPECT_EQ(StandInLog(), expected);
 }

@@ -4,6 +4,7 @@
 #include <cstdarg>
 #include <cstdio>
 #include <string>
+#include <vector>
 
 #include "stand_in_files.h"
 #include "survey_job.h"
@@ -37,9 +38,10 @@ class StandInComm final : public IMarlixComm {
       Log(Format("Destroy %u", flags));
     }
     SetEvent(stop_);
-    if (worker_) {
-      WaitForSingleObject(worker_, 10000);
-      CloseHandle(worker_);
+    // Nothing is freed while a worker may still touch it.
+    for (HANDLE worker : workers_) {
+      WaitForSingleObject(worker, INFINITE);
+      CloseHandle(worker);
     }
     CloseHandle(terminate_);
     CloseHandle(stop_);
@@ -61,9 +63,12 @@ class StandInComm final : public IMarlixComm {
   int ReceiveFile(int wait, bool flag) override {
     Log(Format("ReceiveFile %d %s", wait, flag ? "true" : "false"));
     int result = settings_.Number("result.ReceiveFile", 0);
-    if (result != 0 || worker_) return result;
-    worker_ = CreateThread(nullptr, 0, &StandInComm::Worker, this, 0, nullptr);
-    return worker_ ? 0 : -201;
+    if (result != 0) return result;
+    // Every started transfer ends in a callback, a second one as the first.
+    HANDLE worker = CreateThread(nullptr, 0, &StandInComm::Worker, this, 0, nullptr);
+    if (!worker) return -201;
+    workers_.push_back(worker);
+    return 0;
   }
 
   int SetPoints(PointsBlock* block) override {
@@ -164,7 +169,7 @@ class StandInComm final : public IMarlixComm {
   PointsBlock* points_ = nullptr;
   HANDLE terminate_ = nullptr;
   HANDLE stop_ = nullptr;
-  HANDLE worker_ = nullptr;
+  std::vector<HANDLE> workers_;
   volatile LONG terminations_ = 0;
 };
 

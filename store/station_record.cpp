@@ -69,9 +69,8 @@ bool FindLevelKey(HKEY levels, const std::wstring& name, win::UniqueHKey& levelK
     DWORD length = kKeyNameChars;
     if (RegEnumKeyExW(levels, index, keyName, &length, nullptr, nullptr, nullptr, nullptr) != ERROR_SUCCESS)
       return false;
-    if (RegCreateKeyExW(levels, keyName, 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, levelKey.Put(), nullptr) !=
-        ERROR_SUCCESS)
-      continue;
+    // Opened, not created: a key another process deletes meanwhile must not come back empty.
+    if (RegOpenKeyExW(levels, keyName, 0, KEY_ALL_ACCESS, levelKey.Put()) != ERROR_SUCCESS) continue;
     std::wstring stored;
     if (ReadString(levelKey.Get(), L"Name", stored) != ERROR_SUCCESS) continue;
     if (stored == name) return true;
@@ -249,6 +248,11 @@ HRESULT UpdateStation(const std::wstring& oldName, const CStationRecord& record)
   DWORD disposition = 0;
   LONG rc = RegCreateKeyExW(levels.Get(), keyName, 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, key.Put(), &disposition);
   if (rc == ERROR_SUCCESS && disposition == REG_OPENED_EXISTING_KEY) WriteStation(record, key.Get());
+  // Deleted by another process since it was found: the empty key just made goes again.
+  if (rc == ERROR_SUCCESS && disposition == REG_CREATED_NEW_KEY) {
+    key.Reset();
+    RegDeleteKeyW(levels.Get(), keyName);
+  }
   return rc;
 }
 

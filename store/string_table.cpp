@@ -35,11 +35,6 @@ std::wstring TranslateTableText(const std::wstring& text, LANGID threadLanguage)
 
 }  // namespace
 
-std::wstring CutAtTailMarker(const std::wstring& text) {
-  size_t marker = text.find(L"#$");
-  return marker == std::wstring::npos ? text : text.substr(0, marker);
-}
-
 std::wstring LoadTranslatedString(UINT id) {
   LANGID threadLanguage = GetThreadUILanguage();
   std::wstring text = LoadEnglishEntry(id);

@@ -5,6 +5,3 @@
 
 // The text of string `id` in the calling thread's language; empty if the table has no such entry.
 std::wstring LoadTranslatedString(UINT id);
-
-// The text before the first "#$" marker; the tail behind it only tells twin sentences apart.
-std::wstring CutAtTailMarker(const std::wstring& text);

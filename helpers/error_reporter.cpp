@@ -90,6 +90,8 @@ std::wstring TakeMessage(wchar_t* buffer, DWORD length, bool cut) {
 
 }  // namespace
 
+MessageSourceFn StdReporterMessageSource = &FormatMessageW;
+
 TErrorReporter::TErrorReporter() noexcept { Register(this); }
 
 TErrorReporter::~TErrorReporter() { Unregister(this); }
@@ -120,7 +122,7 @@ std::wstring TStdErrorReporter::GetErrorText(HRESULT code, const wchar_t* text1,
                             reinterpret_cast<DWORD_PTR>(second.c_str()),
                             reinterpret_cast<DWORD_PTR>(third.c_str())};
   wchar_t* buffer = nullptr;
-  DWORD length = FormatMessageW(fromTemplate ? 0x2500 : 0x3100,
+  DWORD length = StdReporterMessageSource(fromTemplate ? 0x2500 : 0x3100,
                                 fromTemplate ? pattern.c_str() : nullptr,
                                 static_cast<DWORD>(code), 0, reinterpret_cast<LPWSTR>(&buffer), 0,
                                 reinterpret_cast<va_list*>(arguments));

@@ -36,6 +36,12 @@ class TInternetErrorReporter final : public TErrorReporter {
                             const wchar_t* text3) const override;
 };
 
+// Where the standard reporter's messages come from: FormatMessageW, unless a test puts
+// a message table of its own in its place.
+using MessageSourceFn = DWORD(WINAPI*)(DWORD flags, LPCVOID source, DWORD code, DWORD language,
+                                       LPWSTR buffer, DWORD size, va_list* arguments);
+extern MessageSourceFn StdReporterMessageSource;
+
 // Never empty unless memory ran out.
 std::wstring BuildErrorText(HRESULT code, const wchar_t* text1 = nullptr,
                             const wchar_t* text2 = nullptr, const wchar_t* text3 = nullptr);

@@ -146,6 +146,35 @@ TEST(ErrorReporter, TwoModuleReportersComeFirstAndOthersJoinInOrder) {
   EXPECT_EQ(BuildErrorText(0x8004ABCD), L"# 8004abcd");
 }
 
+// A system table that knows every code, with all three inserts, in place of Wine's.
+DWORD WINAPI TableWithInserts(DWORD flags, LPCVOID source, DWORD code, DWORD language, LPWSTR buffer, DWORD size,
+                              va_list* arguments) {
+  if (flags & FORMAT_MESSAGE_FROM_SYSTEM)
+    return FormatMessageW((flags & ~FORMAT_MESSAGE_FROM_SYSTEM) | FORMAT_MESSAGE_FROM_STRING, L"%1|%2|%3\r\n", code,
+                          language, buffer, size, arguments);
+  return FormatMessageW(flags, source, code, language, buffer, size, arguments);
+}
+struct SystemTableWithInserts : testing::Test {
+  void SetUp() override { StdReporterMessageSource = TableWithInserts; }
+  void TearDown() override { StdReporterMessageSource = &FormatMessageW; }
+};
+
+TEST_F(SystemTableWithInserts, TheSecondTextGoesInTwiceAndTheThirdNever) {
+  EXPECT_EQ(TStdErrorReporter().GetErrorText(Code(0x80070005), L"one", L"two", L"three"), L"one|two|two");
+}
+
+TEST_F(SystemTableWithInserts, NullTextsAreEmpty) {
+  EXPECT_EQ(TStdErrorReporter().GetErrorText(Code(0x80070005), nullptr, nullptr, nullptr), L"||");
+}
+
+TEST_F(SystemTableWithInserts, FacilityFourNeverReachesTheSystemTable) {
+  EXPECT_EQ(TStdErrorReporter().GetErrorText(Code(0x80040154), L"one", L"two", nullptr), L"");
+}
+
+TEST_F(SystemTableWithInserts, FacilityFourInItsSuccessFormToo) {
+  EXPECT_EQ(TStdErrorReporter().GetErrorText(Code(0x00040200), L"one", L"two", nullptr), L"");
+}
+
 TEST(ErrorReporter, SystemTableInternetCodesAndNamedSources) {
   EXPECT_EQ(BuildErrorText(Code(0x80040154)), L"# 80040154");
   EXPECT_EQ(BuildErrorText(Code(0x80040111)), L"# 80040111") << "row with no text";

@@ -209,6 +209,49 @@ TEST_F(ServerModule, FailedScriptLeavesAttributesUnwrittenAndNothingIsServedAfte
   EXPECT_EQ(server_.UnregisterServer(), S_OK);
 }
 
+TEST(ObjectMap, EightEntriesInTheirOrderWithTheirScripts) {
+  const std::pair<const CLSID*, UINT> expected[] = {
+      {&CLSID_MarlixDLShellFolder, 6},
+      {&CLSID_MarlixDLShellView, 7},
+      {&CLSID_MarlixDLEnumIDList, 3},
+      {&CLSID_MarlixDLExtractIcon, 4},
+      {&CLSID_MarlixDLDataObject, 2},
+      {&CLSID_MarlixDLQueryInfo, 5},
+      {&CLSID_MarlixDLDropTarget, 8},
+      {&CLSID_MarlixDLDropTargetOnListView, 9},
+  };
+  const auto map = ModuleObjectMap();
+  ASSERT_EQ(map.size(), std::size(expected));
+  for (size_t i = 0; i < map.size(); ++i) {
+    EXPECT_TRUE(IsEqualCLSID(*map[i].clsid, *expected[i].first)) << "entry " << i;
+    EXPECT_EQ(map[i].script, expected[i].second) << "entry " << i;
+  }
+}
+
+// A failed entry ends the unregistration of entries and of the type library.
+TEST_F(ServerModule, UnregisteringStopsAtAFailedEntry) {
+  ASSERT_EQ(server_.RegisterServer(), S_OK);
+  const ObjectMapEntry broken[] = {{&CLSID_MarlixDLShellFolder, IDR_REG_SHELLFOLDER, CreateMarlixDLShellFolder},
+                                   {&CLSID_MarlixDLShellView, 999, CreateMarlixDLShellView},
+                                   {&CLSID_MarlixDLEnumIDList, IDR_REG_ENUMIDLIST, CreateMarlixDLEnumIDList}};
+  server_.Init(broken, GetModuleHandleW(nullptr));
+  EXPECT_EQ(server_.UnregisterServer(), S_OK);
+  EXPECT_FALSE(RegKeyExists(kHKCR, kFolderKey));
+  EXPECT_TRUE(RegKeyExists(kHKCR, L"MarlixDLShellExt.MarlixDLEnumIDList"));
+  EXPECT_TRUE(RegKeyExists(kHKCR, kTypeLibKey + L"\\1.0"));
+}
+
+// Whatever failed before, "Attributes" is removed.
+TEST_F(ServerModule, UnregisteringRemovesAttributesAfterAFailure) {
+  const ObjectMapEntry broken[] = {{&CLSID_MarlixDLShellView, 999, CreateMarlixDLShellView},
+                                   {&CLSID_MarlixDLShellFolder, IDR_REG_SHELLFOLDER, CreateMarlixDLShellFolder}};
+  server_.Init(broken, GetModuleHandleW(nullptr));
+  RegSetKeyValueW(kHKCR, (kFolderKey + L"\\ShellFolder").c_str(), L"Attributes", REG_BINARY, kAttributes.data(), 4);
+  EXPECT_EQ(server_.UnregisterServer(), S_OK);
+  EXPECT_TRUE(RegKeyExists(kHKCR, kFolderKey + L"\\ShellFolder"));
+  EXPECT_TRUE(ReadAttributes().empty());
+}
+
 template <class T>  // the name and help text of a type library (index -1) or of one of its entries
 std::pair<std::wstring, std::wstring> Documentation(T* owner, int index) {
   BSTR name = nullptr, help = nullptr;

@@ -15,6 +15,10 @@
 
 namespace kld::ft {
 
+namespace test_only {
+void (*BeforeFilelogRetry)() = nullptr;
+}
+
 namespace {
 
 HANDLE logFile = INVALID_HANDLE_VALUE;
@@ -165,6 +169,7 @@ bool StartFilelog(const wchar_t* name, bool restart) {
                         FILE_ATTRIBUTE_NORMAL, nullptr);
   if (logFile == INVALID_HANDLE_VALUE) {
     Sleep(1);
+    if (test_only::BeforeFilelogRetry) test_only::BeforeFilelogRetry();
     logFile = CreateFileW(path.c_str(), GENERIC_WRITE, FILE_SHARE_READ, nullptr, CREATE_ALWAYS,
                           FILE_ATTRIBUTE_NORMAL, nullptr);
   }

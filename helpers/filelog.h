@@ -67,6 +67,11 @@ class CFilelogStreamBufferT : public std::basic_streambuf<Char> {
   std::basic_string<Char> text_;
 };
 
+namespace test_only {
+// Called between the two attempts to create the log file.
+extern void (*BeforeFilelogRetry)();
+}  // namespace test_only
+
 // Header of machine and process facts.
 void DumpSystemInfo();
 void DumpLocaleInfo();

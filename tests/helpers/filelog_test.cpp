@@ -69,6 +69,43 @@ TEST_F(Filelog, EntriesCarryOnePrefixAndIndentFurtherLinesOrGoToStandardOutput) 
   EXPECT_EQ(CaptureStdout([] { LogTextW(L"wide"); }), "wide\r\n") << "wide text has no such test";
 }
 
+// The prefix tells UTC; the test runs in a zone far from it.
+TEST_F(Filelog, PrefixIsUtc) {
+  SYSTEMTIME utc, local;
+  GetSystemTime(&utc);
+  GetLocalTime(&local);
+  ASSERT_NE(utc.wHour * 60 + utc.wMinute, local.wHour * 60 + local.wMinute) << "the zone must differ from UTC";
+  LogTextA("now");
+  const std::string text = Log();
+  const int logged = std::stoi(text.substr(0, 2)) * 60 + std::stoi(text.substr(3, 2));
+  EXPECT_LE(std::abs(logged - (utc.wHour * 60 + utc.wMinute)) % (24 * 60 - 1), 1) << text;
+}
+
+// A file that can't be made at once is tried once more.
+HANDLE holder;
+TEST_F(Filelog, CreationIsTriedTwice) {
+  StopFilelog();
+  holder = CreateFileW(LogPath().c_str(), GENERIC_READ, 0, nullptr, OPEN_ALWAYS, 0, nullptr);
+  ASSERT_NE(holder, INVALID_HANDLE_VALUE);
+  test_only::BeforeFilelogRetry = [] { CloseHandle(holder); };
+  EXPECT_TRUE(StartFilelog(L"marlix_logtest", true));
+  test_only::BeforeFilelogRetry = nullptr;
+  LogTextA("after the retry");
+  EXPECT_TRUE(Has(Log(), "after the retry"));
+}
+
+// A file that can't be made at all still counts as started: the log just stays silent.
+TEST_F(Filelog, AFileThatCannotBeMadeStillAnswersTrue) {
+  StopFilelog();
+  HANDLE held = CreateFileW(LogPath().c_str(), GENERIC_READ, 0, nullptr, OPEN_ALWAYS, 0, nullptr);
+  ASSERT_NE(held, INVALID_HANDLE_VALUE);
+  EXPECT_TRUE(StartFilelog(L"marlix_logtest", true));
+  EXPECT_EQ(FilelogPath(), NarrowText(LogPath()));
+  LogTextA("nowhere");
+  CloseHandle(held);
+  EXPECT_EQ(Log(), "");
+}
+
 TEST_F(Filelog, RestartDeletesOldLogsThenErrorsHeaderAndStreamsFollow) {
   const std::wstring old = testfiles::TempDirectory() + L"marlix_logtest_1.log",
                      other = testfiles::TempDirectory() + L"marlix_logtestx_1.log";
@@ -97,6 +134,10 @@ TEST_F(Filelog, RestartDeletesOldLogsThenErrorsHeaderAndStreamsFollow) {
                                   std::string("64-bit build. Release version."),
                                   std::string("Languages root directory: ")})
     EXPECT_TRUE(Has(text, line)) << line << " in\n" << text;
+  const size_t internal = text.find("Internal description: "), system = text.find("System description: "),
+               object = text.find("IErrorInfo description: ");
+  EXPECT_LT(internal, system) << "the detail lines keep their order";
+  EXPECT_LT(system, object) << "the detail lines keep their order";
   EXPECT_EQ(FormatByteSize(512), "512.00b");
   EXPECT_EQ(FormatByteSize(1536), "1.50Kb");
   EXPECT_EQ(FormatByteSize(3.0 * 1024 * 1024 * 1024), "3.00Gb");

@@ -75,6 +75,10 @@ TEST(FileSystem, CreatesMissingFoldersOnlyFromAnExistingStart) {
   EXPECT_TRUE(FileExists(file.c_str(), false));
   EXPECT_FALSE(FileExists(file.c_str(), true)) << "locked against sharing";
   CloseHandle(h);
+  h = CreateFileW(file.c_str(), GENERIC_WRITE, FILE_SHARE_READ | FILE_SHARE_WRITE, nullptr, OPEN_EXISTING, 0, nullptr);
+  EXPECT_FALSE(FileExists(file.c_str(), true)) << "a writer is there, and reading shares nothing but reading";
+  CloseHandle(h);
+  EXPECT_FALSE(CreateDirectoryPath((file + L"\\sub").c_str(), nullptr)) << "a file stands where a folder must be";
   EXPECT_TRUE(FileExists(file.c_str(), true));
   EXPECT_TRUE(FileExists((root + L"\\one\\*.txt").c_str(), false));
   EXPECT_FALSE(FileExists((root + L"\\one").c_str(), true));

@@ -4,6 +4,7 @@
 
 #include <atomic>
 #include <climits>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <thread>
@@ -44,6 +45,23 @@ TEST(CommInterface, CallsReachTheirTablePositions) {
   comm->SetTimeout(30); reached(10, 30);
   comm->SetCallback(&CommResultCallback); reached(13, reinterpret_cast<long long>(&CommResultCallback));
   comm->Destroy(1); reached(0, 1);
+}
+
+// Read by byte offset, not through the struct the code writes with.
+TEST(CommInterface, PointsBlockPresetsBytes20And92OfEachRecord) {
+  PointsBlock* block = NewPointsBlock();
+  ASSERT_TRUE(block);
+  const auto* bytes = reinterpret_cast<const unsigned char*>(block);
+  int preset = 0;
+  for (size_t record = 0; record < 5000; ++record) {
+    for (size_t offset : {20u, 92u}) {
+      int32_t value = 0;
+      std::memcpy(&value, bytes + record * 144 + offset, sizeof(value));
+      preset += value == -1;
+    }
+  }
+  EXPECT_EQ(preset, 10000);
+  DeletePointsBlock(block);
 }
 
 TEST(CommInterface, ResultCodesMapToTheirTexts) {
@@ -121,6 +139,73 @@ TEST(StandIn, EveryReceiveFileCallsBack) {
   DeleteFileA(target);
   DeleteFileA((std::string(target) + ".txt").c_str());
   DeleteFileW((folder + L"MarlixComm.txt").c_str());
+}
+
+// The transfer dialog's template, read from the resource as the dialog manager reads it.
+struct TemplateItem {
+  WORD id;
+  WORD atom;  // 0x80 button, 0x81 edit, 0x82 static
+  std::wstring text;
+  RECT box;  // x, y, width, height in dialog units
+  DWORD style;
+};
+const WORD* SkipText(const WORD* at, std::wstring* text = nullptr, WORD* atom = nullptr) {
+  if (*at == 0xFFFF) {
+    if (atom) *atom = at[1];
+    return at + 2;
+  }
+  const WORD* start = at;
+  while (*at) ++at;
+  if (text) text->assign(reinterpret_cast<const wchar_t*>(start), at - start);
+  return at + 1;
+}
+const WORD* Align(const WORD* at) {
+  return reinterpret_cast<const WORD*>((reinterpret_cast<ULONG_PTR>(at) + 3) & ~ULONG_PTR(3));
+}
+
+TEST(DownloadTemplate, LayoutAndStyles) {
+  HRSRC found = FindResourceW(GetModuleHandleW(nullptr), MAKEINTRESOURCEW(213), RT_DIALOG);
+  ASSERT_TRUE(found);
+  const auto* dialog = static_cast<const DLGTEMPLATE*>(LockResource(LoadResource(GetModuleHandleW(nullptr), found)));
+  ASSERT_NE(dialog->style, 0xFFFF0001u) << "a plain template, not an extended one";
+  EXPECT_EQ(dialog->style, DWORD(WS_POPUP | WS_CAPTION | WS_SYSMENU | DS_MODALFRAME | DS_SETFONT | DS_SYSMODAL));
+  EXPECT_EQ(dialog->cx, 267);
+  EXPECT_EQ(dialog->cy, 178);
+  std::wstring caption, font;
+  const WORD* at = SkipText(SkipText(reinterpret_cast<const WORD*>(dialog + 1)));  // menu, class
+  at = SkipText(at, &caption);
+  EXPECT_EQ(caption, L"Download file from Digital Level");
+  EXPECT_EQ(*at, 8) << "points";
+  at = SkipText(at + 1, &font);
+  EXPECT_EQ(font, L"MS Sans Serif");
+  std::vector<TemplateItem> items;
+  for (int i = 0; i < dialog->cdit; ++i) {
+    const auto* item = reinterpret_cast<const DLGITEMTEMPLATE*>(Align(at));
+    TemplateItem read{item->id, 0, L"", {item->x, item->y, item->cx, item->cy}, item->style};
+    at = SkipText(SkipText(reinterpret_cast<const WORD*>(item + 1), nullptr, &read.atom), &read.text);
+    at += 1 + *at / sizeof(WORD);  // creation data
+    items.push_back(read);
+  }
+  const DWORD readOnlyText = ES_READONLY | ES_MULTILINE | ES_AUTOVSCROLL | WS_VSCROLL | WS_BORDER | WS_TABSTOP;
+  const TemplateItem expected[] = {
+      {IDCANCEL, 0x80, L"Cancel", {80, 157, 50, 14}, WS_TABSTOP},
+      {220, 0x80, L"Start", {140, 157, 50, 14}, WS_TABSTOP},
+      {215, 0x82, L"Status text", {45, 142, 215, 10}, 0},
+      {319, 0x82, L"Status:", {5, 142, 25, 10}, 0},
+      {214, 0x81, L"", {5, 5, 255, 112}, readOnlyText},
+      {320, 0x82, L"File name:", {5, 127, 35, 10}, 0},
+      {217, 0x82, L"Name", {45, 127, 215, 10}, 0},
+  };
+  ASSERT_EQ(items.size(), std::size(expected));
+  for (size_t i = 0; i < items.size(); ++i) {
+    SCOPED_TRACE(testing::Message() << "control " << expected[i].id);
+    EXPECT_EQ(items[i].id, expected[i].id);
+    EXPECT_EQ(items[i].atom, expected[i].atom);
+    EXPECT_EQ(items[i].text, expected[i].text);
+    EXPECT_TRUE(EqualRect(&items[i].box, &expected[i].box));
+    EXPECT_EQ(items[i].style & expected[i].style, expected[i].style);
+    EXPECT_EQ(items[i].style & (WS_CHILD | WS_VISIBLE), DWORD(WS_CHILD | WS_VISIBLE));
+  }
 }
 
 TEST(ViewNotify, MessagesKeepTheirTextsAndABroadcastReachesEveryViewThroughItsHiddenWindow) {

@@ -194,8 +194,11 @@ TEST_F(DataObject, DragPictureIsCleanedOnlyWhenNothingIsHeld) {
   HIMAGELIST image = ImageList_Create(16, 16, ILC_COLOR32, 1, 1);
   ImageList_ReplaceIcon(image, -1, LoadIconW(nullptr, IDI_APPLICATION));
   obj->SetDragImage(image, list, POINT{-3, -4});
+  POINT at{}, hotSpot{};
+  EXPECT_EQ(ImageList_GetDragImage(&at, &hotSpot), nullptr);
   EXPECT_EQ(obj->GiveFeedback(DROPEFFECT_COPY), DRAGDROP_S_USEDEFAULTCURSORS);
   EXPECT_TRUE(obj->DragImageShown);
+  EXPECT_NE(ImageList_GetDragImage(&at, &hotSpot), nullptr) << "the first feedback begins the drag picture";
   EXPECT_EQ(obj->GiveFeedback(DROPEFFECT_NONE), DRAGDROP_S_USEDEFAULTCURSORS);
   EXPECT_EQ(obj->QueryContinueDrag(FALSE, MK_LBUTTON), S_OK);
   EXPECT_EQ(obj->QueryContinueDrag(TRUE, MK_LBUTTON), DRAGDROP_S_CANCEL);
@@ -203,6 +206,7 @@ TEST_F(DataObject, DragPictureIsCleanedOnlyWhenNothingIsHeld) {
   EXPECT_TRUE(obj->DragImageShown) << "neither escape nor a key still held cleans up";
   EXPECT_EQ(obj->QueryContinueDrag(FALSE, 0), DRAGDROP_S_DROP);
   EXPECT_FALSE(obj->DragImageShown);
+  EXPECT_EQ(ImageList_GetDragImage(&at, &hotSpot), nullptr) << "the drag picture has ended";
   EXPECT_EQ(obj->DragImage, nullptr);
   EXPECT_EQ(obj->QueryContinueDrag(TRUE, 0), DRAGDROP_S_CANCEL);
   DestroyWindow(list);

@@ -52,8 +52,8 @@ TEST_F(DllExports, ClassObjectsForTheMapOnly) {
       {&CLSID_MarlixDLExtractIcon, true},
       {&CLSID_MarlixDLDataObject, true},
       {&CLSID_MarlixDLQueryInfo, true},
-      {&CLSID_MarlixDLDropTarget, false},
-      {&CLSID_MarlixDLDropTargetOnListView, false},
+      {&CLSID_MarlixDLDropTarget, true},
+      {&CLSID_MarlixDLDropTargetOnListView, true},
   };
   for (size_t i = 0; i < std::size(classes); ++i) {
     const auto [clsid, real] = classes[i];

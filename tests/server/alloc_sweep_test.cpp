@@ -233,6 +233,64 @@ void DataObjectFormats() {
   }
 }
 
+// The least a browser must answer for a view to open in it; made with counting paused.
+class Browser : public com::ComObject<IShellBrowser> {
+ public:
+  Browser() {
+    frame = CreateWindowExW(0, L"STATIC", nullptr, WS_OVERLAPPEDWINDOW, 0, 0, 400, 300, nullptr, nullptr, nullptr,
+                            nullptr);
+  }
+  ~Browser() override { DestroyWindow(frame); }
+  HWND frame;
+  STDMETHODIMP GetWindow(HWND* window) override { return *window = frame, S_OK; }
+  STDMETHODIMP ContextSensitiveHelp(BOOL) override { return E_NOTIMPL; }
+  STDMETHODIMP InsertMenusSB(HMENU, LPOLEMENUGROUPWIDTHS) override { return S_OK; }
+  STDMETHODIMP SetMenuSB(HMENU, HOLEMENU, HWND) override { return S_OK; }
+  STDMETHODIMP RemoveMenusSB(HMENU) override { return S_OK; }
+  STDMETHODIMP SetStatusTextSB(LPCWSTR) override { return S_OK; }
+  STDMETHODIMP EnableModelessSB(BOOL) override { return S_OK; }
+  STDMETHODIMP TranslateAcceleratorSB(MSG*, WORD) override { return S_FALSE; }
+  STDMETHODIMP BrowseObject(PCUIDLIST_RELATIVE, UINT) override { return S_OK; }
+  STDMETHODIMP GetViewStateStream(DWORD, IStream** stream) override { return *stream = nullptr, E_FAIL; }
+  STDMETHODIMP GetControlWindow(UINT, HWND* window) override { return *window = nullptr, E_NOTIMPL; }
+  STDMETHODIMP SendControlMsg(UINT, UINT, WPARAM, LPARAM, LRESULT* result) override {
+    if (result) *result = 0;
+    return S_OK;
+  }
+  STDMETHODIMP QueryActiveShellView(IShellView** view) override { return *view = nullptr, E_NOTIMPL; }
+  STDMETHODIMP OnViewWindowActive(IShellView*) override { return S_OK; }
+  STDMETHODIMP SetToolbarItems(LPTBBUTTONSB, UINT, UINT) override { return S_OK; }
+};
+
+// Messages go on being handled until the view's worker has let go of the module.
+void PumpUntilUnlocked() {
+  for (ULONGLONG end = GetTickCount64() + 5000; com::ModuleLockCount() != 0 && GetTickCount64() < end;) {
+    MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT);
+    MSG message;
+    while (PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE)) DispatchMessageW(&message);
+  }
+}
+
+void ViewCreation() {
+  com::ComPtr<Browser> browser = [] {
+    Paused paused;
+    return com::Make<Browser>();
+  }();
+  if (auto root = Root()) {
+    IShellView* view = nullptr;
+    if (root->CreateViewObject(nullptr, IID_IShellView, reinterpret_cast<void**>(&view)) == S_OK) {
+      FOLDERSETTINGS settings{FVM_DETAILS, 0};
+      RECT box{0, 0, 300, 200};
+      HWND window = nullptr;
+      if (view->CreateViewWindow(nullptr, &settings, browser.Get(), &box, &window) == S_OK) view->DestroyViewWindow();
+      view->Release();
+    }
+  }
+  Paused paused;
+  browser.Reset();
+  PumpUntilUnlocked();
+}
+
 void Registration() {
   CServerModule server;
   server.SetTypeLibId(LIBID_MarlixDLShellExtLib);
@@ -248,7 +306,7 @@ const Row kRows[] = {
     {"folder: item objects, tip and menu", FolderItemObjects},
     {"data object: every format and the format list", DataObjectFormats},
     {"registration and unregistration", Registration},
-    // The view's creation joins here as one more row.
+    {"the view's creation, in a browser", ViewCreation},
 };
 
 class AllocationSweep : public testing::TestWithParam<Row> {

@@ -87,8 +87,11 @@ TEST(TranslateFile, EscapesPairingAndTails) {
 
 TEST(TranslateFile, LoadRefusesAnythingButUtf16WithMarkAndTakesHugeFiles) {
   struct { std::string bytes; HRESULT hr; const char* what; } rows[] = {
-      {"", E_FAIL, "empty"}, {"\xFF", E_FAIL, "half a mark"}, {"\xEF\xBB\xBF[a]\r\n[b]\r\n", E_FAIL, "UTF-8"},
-      {testfiles::Utf16File(L"[a]\r\n[b]\r\n").substr(2), E_FAIL, "no mark"}, {"\xFF\xFE", S_OK, "mark only"},
+      {"", E_FAIL, "empty"},
+      {"\xFF", E_FAIL, "half a mark"},
+      {"\xEF\xBB\xBF[a]\r\n[b]\r\n", E_FAIL, "UTF-8"},
+      {testfiles::Utf16File(L"[a]\r\n[b]\r\n").substr(2), E_FAIL, "no mark"},
+      {"\xFF\xFE", S_OK, "mark only"},
       {testfiles::Utf16File(L"\r\n\n\r\r\r\n"), S_OK, "line ends"},
       {testfiles::Utf16File(L"[[[[\n]]]\n[\n"), S_OK, "brackets without pairs"}};
   for (const auto& r : rows) {

@@ -36,46 +36,6 @@ const std::wstring kNameSpace = L"Software\\Microsoft\\Windows\\CurrentVersion\\
 const std::wstring kLevel = L"Software\\Gravon\\Shell Extensions\\Marlix DL View\\Levels\\Station 0";
 const std::vector<BYTE> kAttributes = {0x00, 0x00, 0x00, 0xA0};
 
-struct TwoFaces : com::ComObject<IPersistFolder, IDropTarget> {
-  STDMETHODIMP GetClassID(CLSID*) override { return E_NOTIMPL; }
-  STDMETHODIMP Initialize(PCIDLIST_ABSOLUTE) override { return S_OK; }
-  STDMETHODIMP DragEnter(IDataObject*, DWORD, POINTL, DWORD*) override { return E_NOTIMPL; }
-  STDMETHODIMP DragOver(DWORD, POINTL, DWORD*) override { return E_NOTIMPL; }
-  STDMETHODIMP DragLeave() override { return E_NOTIMPL; }
-  STDMETHODIMP Drop(IDataObject*, DWORD, POINTL, DWORD*) override { return E_NOTIMPL; }
-};
-
-TEST(ComObject, AnswersListedInterfacesOnlyAndHoldsTheModule) {
-  long before = com::ModuleLockCount();
-  {
-    auto obj = com::Make<TwoFaces>();
-    ASSERT_TRUE(obj);
-    EXPECT_EQ(com::ModuleLockCount(), before + 1);
-    com::ComPtr<IDropTarget> target;
-    com::ComPtr<IPersistFolder> folder;
-    com::ComPtr<IUnknown> a, b;
-    ASSERT_TRUE(obj.As(&target) == S_OK && target.As(&a) == S_OK && obj.As(&folder) == S_OK && folder.As(&b) == S_OK);
-    EXPECT_EQ(a.Get(), b.Get()) << "one identity for IUnknown";
-    com::ComPtr<IPersist> persist;
-    EXPECT_EQ(obj.As(&persist), E_NOINTERFACE) << "IPersist is a base of IPersistFolder but not listed";
-    EXPECT_FALSE(persist);
-    EXPECT_EQ(obj->QueryInterface(IID_IDropTarget, nullptr), E_POINTER);
-  }
-  EXPECT_EQ(com::ModuleLockCount(), before);
-}
-
-TEST(RegistrySandbox, RedirectsAndCleansTheCurrentUser) {
-  std::wstring scratch;
-  {
-    RegistrySandbox sandbox;
-    scratch = sandbox.ScratchPath(HKEY_CURRENT_USER);
-    EXPECT_FALSE(RegKeyExists(HKEY_CURRENT_USER, L"Software\\Probe"));
-    RegWriteDword(HKEY_CURRENT_USER, L"Software\\Probe", L"V", 7);
-    EXPECT_EQ(RegReadDword(HKEY_CURRENT_USER, L"Software\\Probe", L"V"), 7u);
-  }
-  EXPECT_FALSE(RegKeyExists(HKEY_CURRENT_USER, L"Software\\Probe") || RegKeyExists(HKEY_CURRENT_USER, scratch));
-}
-
 TEST(Registrar, ScriptsWriteAndTakeBackAndSyntaxErrorsChangeNothing) {
   RegistrySandbox sandbox({kHKCR, kHKLM});
   RegWriteString(kHKLM, L"Shared", L"Other", L"kept");

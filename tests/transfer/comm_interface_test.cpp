@@ -35,16 +35,25 @@ TEST(CommInterface, CallsReachTheirTablePositions) {
     EXPECT_EQ(static_cast<int>(fake.first), static_cast<int>(first)) << "slot " << slot;
   };
   const char* path = "x";
-  comm->SetCommParameters(3, 19200, 2, 1, 1, 7, 0); reached(2, 3);
-  comm->Initialize(); EXPECT_EQ(fake.slot, 3);
-  comm->ReceiveFile(20, true); reached(4, 20);
+  comm->SetCommParameters(3, 19200, 2, 1, 1, 7, 0);
+  reached(2, 3);
+  comm->Initialize();
+  EXPECT_EQ(fake.slot, 3);
+  comm->ReceiveFile(20, true);
+  reached(4, 20);
   EXPECT_EQ(static_cast<unsigned char>(fake.second), 1);
-  comm->SetPoints(nullptr); reached(6, 0);
-  comm->TerminateConnection(); EXPECT_EQ(fake.slot, 8);
-  comm->SetFilePath(path); reached(9, reinterpret_cast<long long>(path));
-  comm->SetTimeout(30); reached(10, 30);
-  comm->SetCallback(&CommResultCallback); reached(13, reinterpret_cast<long long>(&CommResultCallback));
-  comm->Destroy(1); reached(0, 1);
+  comm->SetPoints(nullptr);
+  reached(6, 0);
+  comm->TerminateConnection();
+  EXPECT_EQ(fake.slot, 8);
+  comm->SetFilePath(path);
+  reached(9, reinterpret_cast<long long>(path));
+  comm->SetTimeout(30);
+  reached(10, 30);
+  comm->SetCallback(&CommResultCallback);
+  reached(13, reinterpret_cast<long long>(&CommResultCallback));
+  comm->Destroy(1);
+  reached(0, 1);
 }
 
 // Read by byte offset, not through the struct the code writes with.
@@ -66,10 +75,13 @@ TEST(CommInterface, PointsBlockPresetsBytes20And92OfEachRecord) {
 
 TEST(CommInterface, ResultCodesMapToTheirTexts) {
   const std::pair<std::vector<int>, const wchar_t*> rows[] = {
-      {{0}, L"No error"}, {{-101}, L"The waiting time of the data has expired."},
+      {{0}, L"No error"},
+      {{-101}, L"The waiting time of the data has expired."},
       {{-102}, L"The communication's process is interrupted by the user"},
-      {{-201, -202, -203}, L"Unable to create file for saving"}, {{-204}, L"The checksum is incorrect"},
-      {{-301}, L"Temporary file open error"}, {{-302}, L"Point name or memo is wrong"},
+      {{-201, -202, -203}, L"Unable to create file for saving"},
+      {{-204}, L"The checksum is incorrect"},
+      {{-301}, L"Temporary file open error"},
+      {{-302}, L"Point name or memo is wrong"},
       {{1, -1, 101, -100, -103, -200, -205, -300, -303, INT_MIN, INT_MAX}, L"Unknown error"}};
   for (const auto& [codes, text] : rows)
     for (int code : codes) EXPECT_EQ(CommResultText(code), text) << "code " << code;

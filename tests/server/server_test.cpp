@@ -198,7 +198,7 @@ TEST_F(ServerModule, UnregisteringStopsAtAFailedEntry) {
   EXPECT_EQ(server_.UnregisterServer(), S_OK);
   EXPECT_FALSE(RegKeyExists(kHKCR, kFolderKey));
   EXPECT_TRUE(RegKeyExists(kHKCR, L"MarlixDLShellExt.MarlixDLEnumIDList"));
-  EXPECT_TRUE(RegKeyExists(kHKCR, kTypeLibKey + L"\\1.0"));
+  EXPECT_TRUE(RegKeyExists(kHKCR, kTypeLibKey + L"\\" MARLIX_TYPELIB_VERSION_WIDE));
 }
 
 // Whatever failed before, "Attributes" is removed.

@@ -3,7 +3,9 @@
 //   shell_view.cpp           COM surface, creation and destruction
 //   shell_view_window.cpp    window procedure, list, fill and the enumeration thread
 //   shell_view_modes.cpp     view modes, columns and sorting
-//   shell_view_commands.cpp  the command dispatcher, menus and item operations
+//   shell_view_commands.cpp  the command dispatcher, command target and activation
+//   shell_view_menus.cpp     merged menus and the context menu
+//   shell_view_items.cpp     operations on items: new, properties, delete, copy, paste, drag
 #pragma once
 #include <windows.h>
 #include <commctrl.h>
@@ -13,6 +15,7 @@
 #include <atomic>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "server/class_ids.h"
 #include "server/com_base.h"
@@ -143,13 +146,30 @@ class CMarlixDLShellView
   // Sorts the rows, by the folder's default order or by the process-wide sort state.
   void SortRows(bool bySortColumn);
   void StoreColumnWidths();
-  // Commands and menus (shell_view_commands.cpp)
+  // Commands (shell_view_commands.cpp)
   void ActivateUI(UINT state);
   void DeactivateUI();
+  void OnActivateItem();
+  // Menus (shell_view_menus.cpp). `merged` places entries in the browser's menus;
+  // otherwise each goes at the end of a popup of our own.
   void BuildMenus();
   void OnContextMenu(int x, int y);
+  void FillFileMenu(HMENU menu, bool merged);
+  void FillViewMenu(HMENU menu, bool merged);
+  void FillEditMenu(HMENU menu, bool merged);
+  // Items (shell_view_items.cpp)
+  void OnNewLevel();
+  void OnProperties();
+  void OnDelete();
+  void OnCopy();
+  void OnPaste();
   void OnBeginDrag(NMLISTVIEW* info);
-  void OnActivateItem();
+  // Rows of the selection, in order.
+  std::vector<int> SelectedRows();
+  // A row's item id (null for the add row or a row that is gone).
+  LPCITEMIDLIST RowId(int row);
+  // Adds the full list of every selected row to `data`; the last row handled, or -1.
+  int AddSelection(class CMarlixDLDataObject* data);
 
   tagPIDLTYPE FolderType();
 

@@ -1,5 +1,5 @@
-// The view's commands: one dispatcher for every source, the browser's merged menus,
-// and opening items.
+// The view's commands: one dispatcher for every source (menus, keys, the command
+// target, the list's activation), and opening items.
 #include "shell/shell_view.h"
 
 #include "base/boundary.h"
@@ -19,6 +19,21 @@ LRESULT CMarlixDLShellView::OnCommand(UINT id) {
       break;
     case kCmdActivate:
       OnActivateItem();
+      break;
+    case kCmdNewLevel:
+      OnNewLevel();
+      break;
+    case kCmdCopy:
+      OnCopy();
+      break;
+    case kCmdPaste:
+      OnPaste();
+      break;
+    case kCmdProperties:
+      OnProperties();
+      break;
+    case kCmdDelete:
+      OnDelete();
       break;
   }
   return 0;
@@ -66,21 +81,16 @@ void CMarlixDLShellView::DeactivateUI() {
   UIState = SVUIA_DEACTIVATE;
 }
 
-// The merged File, View and Edit menus come with the commands; until then the view
-// merges nothing.
-void CMarlixDLShellView::BuildMenus() {}
-
-void CMarlixDLShellView::OnContextMenu(int, int) {}
-
-void CMarlixDLShellView::OnBeginDrag(NMLISTVIEW*) {}
-
 // Opens the first selected row: a level is browsed into; the virtual file, which no
 // browser can enter, is a file dialog's default command.
 void CMarlixDLShellView::OnActivateItem() {
   if (!IsWindow(ListWindow)) return;
   int row = static_cast<int>(SendMessageW(ListWindow, LVM_GETNEXTITEM, static_cast<WPARAM>(-1), LVNI_SELECTED));
   if (row < 0) return;
-  if (FolderType() == PIDL_ROOT && row == 0) return;  // the add row: a new level, with the property sheet
+  if (FolderType() == PIDL_ROOT && row == 0) {
+    OnNewLevel();
+    return;
+  }
   LVITEMW item{};
   item.mask = LVIF_PARAM;
   item.iItem = row;

@@ -7,9 +7,14 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
+#include <algorithm>
+#include <atomic>
 #include <functional>
+#include <thread>
 
+#include "base/resource_ids.h"
 #include "base/window_messages.h"
+#include "config/sheet_driver.h"
 #include "server/class_creators.h"
 #include "shell/item_services.h"
 #include "shell/shell_folder.h"
@@ -52,6 +57,22 @@ LRESULT CALLBACK FrameProc(HWND window, UINT message, WPARAM wParam, LPARAM lPar
 }
 
 // A browser that records what the view tells it. A file dialog when `dialog` is set.
+void AddPopup(HMENU bar, UINT id, const wchar_t* title, std::vector<std::pair<UINT, std::wstring>> entries) {
+  HMENU popup = CreatePopupMenu();
+  for (auto& [entryId, text] : entries) {
+    MENUITEMINFOW item{sizeof(item), MIIM_ID | MIIM_FTYPE | MIIM_STRING};
+    item.fType = text == L"-" ? MFT_SEPARATOR : MFT_STRING;
+    item.wID = entryId;
+    item.dwTypeData = text.data();
+    InsertMenuItemW(popup, GetMenuItemCount(popup), TRUE, &item);
+  }
+  MENUITEMINFOW item{sizeof(item), MIIM_ID | MIIM_SUBMENU | MIIM_STRING};
+  item.wID = id;
+  item.hSubMenu = popup;
+  item.dwTypeData = const_cast<wchar_t*>(title);
+  InsertMenuItemW(bar, GetMenuItemCount(bar), TRUE, &item);
+}
+
 class FakeBrowser : public com::ComObject<IShellBrowser, ICommDlgBrowser> {
  public:
   explicit FakeBrowser(bool dialog = false) : dialog_(dialog) {
@@ -87,9 +108,23 @@ class FakeBrowser : public com::ComObject<IShellBrowser, ICommDlgBrowser> {
     return windowFails ? E_FAIL : S_OK;
   }
   STDMETHODIMP ContextSensitiveHelp(BOOL) override { return E_NOTIMPL; }
-  STDMETHODIMP InsertMenusSB(HMENU, LPOLEMENUGROUPWIDTHS) override { return S_OK; }
-  STDMETHODIMP SetMenuSB(HMENU, HOLEMENU, HWND) override { return S_OK; }
-  STDMETHODIMP RemoveMenusSB(HMENU) override { return S_OK; }
+  // As Explorer merges: File, Edit and View popups holding entries of the browser's own.
+  STDMETHODIMP InsertMenusSB(HMENU menu, LPOLEMENUGROUPWIDTHS) override {
+    AddPopup(menu, FCIDM_MENU_FILE, L"&File", {{0x7001, L"Close"}});
+    AddPopup(menu, FCIDM_MENU_EDIT, L"&Edit", {{0x7002, L"Undo"}});
+    AddPopup(menu, FCIDM_MENU_VIEW, L"&View",
+             {{0x7003, L"Status Bar"}, {FCIDM_MENU_VIEW_SEP_OPTIONS, L"-"}, {0x7004, L"Options"}});
+    return S_OK;
+  }
+  STDMETHODIMP SetMenuSB(HMENU menu, HOLEMENU, HWND) override {
+    shown = menu;
+    return S_OK;
+  }
+  STDMETHODIMP RemoveMenusSB(HMENU menu) override {
+    while (GetMenuItemCount(menu) > 0) DeleteMenu(menu, 0, MF_BYPOSITION);
+    return S_OK;
+  }
+  HMENU shown = nullptr;  // the menu bar the view gave the browser
   STDMETHODIMP SetStatusTextSB(LPCWSTR) override { return S_OK; }
   STDMETHODIMP EnableModelessSB(BOOL) override { return S_OK; }
   STDMETHODIMP TranslateAcceleratorSB(MSG*, WORD) override { return S_FALSE; }
@@ -415,10 +450,7 @@ TEST_F(View, RefreshWhileTheThreadRunsStartsNoSecondThread) {
 TEST_F(View, ActivatingALevelBrowsesIntoItAndTheFileIsTheDialogsDefaultCommand) {
   HWND view = Open(root_.Get());
   Command(view, kCmdActivate);
-  Select(view, 0);
-  Command(view, kCmdActivate);
-  EXPECT_TRUE(browser_->browsed.empty()) << "nothing, or the add row, selected";
-  Select(view, -1);
+  EXPECT_TRUE(browser_->browsed.empty()) << "nothing selected";
   Select(view, 1);
   Select(view, 3);
   Command(view, kCmdActivate);
@@ -574,6 +606,342 @@ TEST_F(View, AThousandOpenFillCloseCyclesLeakNothing) {
   EXPECT_EQ(end.windows, start.windows) << "windows";
   printf("%d cycles: kernel handles %ld->%ld, GDI objects %ld->%ld, windows %ld->%ld\n", cycles, start.handles,
          end.handles, start.gdi, end.gdi, start.windows, end.windows);
+}
+
+
+// ---- Commands ----
+
+// Runs `action` here while a second thread answers each property sheet it opens, as a
+// person would: reads the name on the General page and presses the next of `buttons`
+// (Cancel once they run out). Gives the names the sheets showed, in order.
+Texts AnswerSheets(const std::function<void()>& action, std::vector<int> buttons) {
+  std::atomic<bool> done{false};
+  Texts names;
+  std::thread person([&] {
+    size_t next = 0;
+    while (!done) {
+      HWND window = sheet::OwnedDialog(nullptr);
+      if (!window) {
+        Sleep(20);
+        continue;
+      }
+      names.push_back(sheet::Text(sheet::Page(window, 0), IDC_STATION_NAME));
+      sheet::Press(window, next < buttons.size() ? buttons[next++] : IDCANCEL);
+      sheet::WaitFor([&] { return !IsWindow(window); });
+    }
+  });
+  action();
+  done = true;
+  person.join();
+  return names;
+}
+
+// Names of the stored levels, in store order.
+Texts Stored() {
+  Texts names;
+  for (const std::wstring& line : sheet::StoredLevels()) names.push_back(line.substr(0, line.find(L'|')));
+  std::sort(names.begin(), names.end());
+  return names;
+}
+
+// A key as the browser passes it on: pressed with `modifiers` (VK_CONTROL, VK_SHIFT) held.
+HRESULT Key(IShellView* view, HWND list, UINT key, std::vector<BYTE> modifiers = {}) {
+  BYTE keys[256] = {};
+  GetKeyboardState(keys);
+  for (BYTE m : modifiers) keys[m] = 0x80;
+  SetKeyboardState(keys);
+  MSG msg{list, WM_KEYDOWN, key, 1};
+  HRESULT hr = view->TranslateAccelerator(&msg);
+  for (BYTE m : modifiers) keys[m] = 0;
+  SetKeyboardState(keys);
+  return hr;
+}
+
+// Text and state of every entry, as a user reads them.
+Texts Entries(HMENU menu) {
+  Texts entries;
+  for (int i = 0; i < GetMenuItemCount(menu); ++i) {
+    wchar_t text[64] = {};
+    MENUITEMINFOW item{sizeof(item), MIIM_STATE | MIIM_FTYPE | MIIM_STRING};
+    item.dwTypeData = text;
+    item.cch = 64;
+    GetMenuItemInfoW(menu, i, TRUE, &item);
+    std::wstring entry = (item.fType & MFT_SEPARATOR) ? L"-" : text;
+    if (item.fState & MFS_DEFAULT) entry += L" default";
+    if (item.fState & MFS_GRAYED) entry += L" grey";
+    if (item.fState & MFS_CHECKED) entry += L" checked";
+    entries.push_back(entry);
+  }
+  return entries;
+}
+
+Texts Popup(HMENU bar, UINT id) {
+  MENUITEMINFOW item{sizeof(item), MIIM_SUBMENU};
+  if (!bar || !GetMenuItemInfoW(bar, id, FALSE, &item)) return {L"<no popup>"};
+  return Entries(item.hSubMenu);
+}
+
+void Refilled(HWND view) { EXPECT_TRUE(PumpUntil([&] { return !AnimationOf(view) && !Rows(view).empty(); })); }
+
+void ParkCursorAwayFrom(HWND view) {
+  RECT r{};
+  GetWindowRect(view, &r);
+  SetCursorPos(r.right + 50, r.bottom + 50);
+}
+
+TEST_F(View, CreateOpensTheNewLevelSheetFromTheAddRowAndOnlyItsOkStoresAndReloads) {
+  HWND view = Open(root_.Get());
+  SeedLevel(9, L"New digital level");
+  Select(view, 0);
+  frameCommands.clear();
+  EXPECT_EQ(AnswerSheets([&] { Command(view, kCmdActivate); }, {IDCANCEL}), Texts{L"New digital level (2)"});
+  EXPECT_TRUE(frameCommands.empty()) << "a cancelled sheet reloads nothing";
+  EXPECT_EQ(AnswerSheets([&] { Command(view, kCmdNewLevel); }, {IDOK}), Texts{L"New digital level (2)"});
+  EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"New digital level", L"New digital level (2)", L"alpha"}));
+  EXPECT_EQ(frameCommands, std::vector<WPARAM>{kCmdBrowserRefresh});
+  ASSERT_TRUE(PumpUntil([&] { return Rows(view).size() == 6; })) << "the list shows the new level";
+}
+
+TEST_F(View, PropertiesOpensOneSheetAfterAnotherWhileTheyAreCancelled) {
+  HWND view = Open(root_.Get());
+  for (int row : {0, 1, 2, 3}) Select(view, row);
+  EXPECT_EQ(AnswerSheets([&] { Command(view, kCmdProperties); }, {IDCANCEL, IDOK}), (Texts{L"alpha", L"Bravo"}))
+      << "the add row gets no sheet, and an OK ends the walk";
+  Refilled(view);
+  Select(view, 1);
+  DeleteStation([] { CStationRecord r; r.Name = L"alpha"; return r; }());
+  EXPECT_EQ(AnswerSheets([&] { Command(view, kCmdProperties); }, {IDCANCEL}), Texts{L"alpha"})
+      << "a level gone meanwhile opens with its name";
+  EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie"}));
+  Select(view, -1);
+  EXPECT_EQ(AnswerSheets([&] { Command(view, kCmdProperties); }, {}), Texts{}) << "nothing selected";
+}
+
+TEST_F(View, KeysCopyPasteAndDeleteThroughTheTableAndTheBrowserSeesThemToo) {
+  CStationRecord full;
+  full.Name = L"Delta", full.Port = 7, full.BaudRate = 19200, full.StopBits = 2, full.Parity = 1, full.DataBits = 7;
+  full.Flow = 1, full.CheckSum = 0, full.Manufacturer = L"spare battery", full.Model = L"HRA40";
+  ASSERT_EQ(AddStation(full), S_OK);
+  HWND view = Open(root_.Get());
+  HWND list = ListOf(view);
+  IShellView* shell = Last();
+  Select(view, 4);  // Delta
+  EXPECT_EQ(Key(shell, list, 'C', {VK_CONTROL}), S_FALSE);
+  EXPECT_EQ(Key(shell, list, 'V', {VK_CONTROL}), S_FALSE);
+  Refilled(view);
+  Select(view, 2);  // Bravo
+  EXPECT_EQ(Key(shell, list, VK_INSERT, {VK_CONTROL}), S_FALSE);
+  EXPECT_EQ(Key(shell, list, VK_INSERT, {VK_SHIFT}), S_FALSE);
+  EXPECT_EQ(Key(shell, list, VK_INSERT, {VK_SHIFT}), S_FALSE);
+  Refilled(view);
+  EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"Copy of Bravo", L"Copy of Copy of Bravo", L"Copy of Delta",
+                             L"Delta", L"alpha"}));
+  auto levels = sheet::StoredLevels();
+  EXPECT_NE(std::find(levels.begin(), levels.end(), L"Copy of Delta|7|19200|2|1|7|1|0|spare battery|HRA40"),
+            levels.end()) << "every field but the name as it came";
+  Select(view, 0);
+  Select(view, 1);  // the add row and alpha
+  EXPECT_EQ(Key(shell, list, VK_DELETE), S_FALSE);
+  EXPECT_EQ(Key(shell, list, 'X', {VK_CONTROL}), S_FALSE) << "no such key";
+  Refilled(view);
+  EXPECT_EQ(Stored().size(), 6u);
+  EXPECT_EQ(Stored().back(), L"Delta") << "alpha deleted without a question";
+  OleSetClipboard(nullptr);
+}
+
+TEST_F(View, CopyingTheAddRowPutsTheFolderItselfOnTheClipboard) {
+  HWND view = Open(root_.Get());
+  Select(view, 0);
+  Command(view, kCmdCopy);
+  com::ComPtr<IDataObject> clip;
+  ASSERT_EQ(OleGetClipboard(clip.Put()), S_OK);
+  FORMATETC format{static_cast<CLIPFORMAT>(RegisterClipboardFormatW(CFSTR_FILEDESCRIPTORW)), nullptr,
+                   DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+  STGMEDIUM medium{};
+  ASSERT_EQ(clip->GetData(&format, &medium), S_OK) << "one item, though no level";
+  EXPECT_EQ(static_cast<FILEGROUPDESCRIPTORW*>(GlobalLock(medium.hGlobal))->cItems, 1u);
+  GlobalUnlock(medium.hGlobal);
+  ReleaseStgMedium(&medium);
+  clip.Reset();
+  Command(view, kCmdPaste);
+  EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"alpha"})) << "the folder is no level";
+  OleSetClipboard(nullptr);
+}
+
+// Puts a "Marlix Total Stations" block on the clipboard as another process would, cut
+// at `keep` bytes, or with the second record's size field set to `secondSize`.
+void ClipStations(size_t keep, DWORD secondSize = 0) {
+  CStationRecord a, b;
+  a.Name = L"One", b.Name = L"Two";
+  HGLOBAL packed = PackStations({a, b});
+  size_t size = GlobalSize(packed);
+  std::vector<BYTE> bytes(size);
+  memcpy(bytes.data(), GlobalLock(packed), size);
+  GlobalUnlock(packed);
+  GlobalFree(packed);
+  if (secondSize) {
+    DWORD first = 0;
+    memcpy(&first, bytes.data() + 4, 4);
+    memcpy(bytes.data() + 8 + first, &secondSize, 4);
+  }
+  keep = std::min(keep, size);
+  HGLOBAL block = GlobalAlloc(GMEM_MOVEABLE, keep);
+  memcpy(GlobalLock(block), bytes.data(), keep);
+  GlobalUnlock(block);
+  ASSERT_TRUE(OpenClipboard(nullptr));
+  EmptyClipboard();
+  SetClipboardData(RegisterClipboardFormatW(L"Marlix Total Stations"), block);
+  CloseClipboard();
+}
+
+TEST_F(View, PasteTakesWholeRecordsOnlyAndNothingFromAnEmptyOrForeignClipboard) {
+  HWND view = Open(root_.Get());
+  const Texts three = {L"Bravo", L"Charlie", L"alpha"};
+  ASSERT_TRUE(OpenClipboard(nullptr));
+  EmptyClipboard();
+  CloseClipboard();
+  Command(view, kCmdPaste);
+  EXPECT_EQ(Stored(), three) << "empty clipboard";
+  ASSERT_TRUE(OpenClipboard(nullptr));
+  EmptyClipboard();
+  HGLOBAL text = GlobalAlloc(GMEM_MOVEABLE, 8);
+  memcpy(GlobalLock(text), L"One", 8);
+  GlobalUnlock(text);
+  SetClipboardData(CF_UNICODETEXT, text);
+  CloseClipboard();
+  Command(view, kCmdPaste);
+  EXPECT_EQ(Stored(), three) << "a foreign format only";
+  ClipStations(SIZE_MAX, 0x7FFFFFF0);
+  Command(view, kCmdPaste);
+  EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"One", L"alpha"})) << "a lying size: the record before it";
+  ClipStations(40);
+  Command(view, kCmdPaste);
+  EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"One", L"alpha"})) << "cut inside the first record: nothing";
+  Refilled(view);
+  EXPECT_EQ(Rows(view).size(), 5u);
+  OleSetClipboard(nullptr);
+}
+
+TEST_F(View, DeleteInALevelsViewDeletesNothingYetEveryViewOfALevelReloads) {
+  HWND root = Open(root_.Get());
+  UniqueList alpha = MakeId(PIDL_LEVEL, L"alpha");
+  auto level = Bind(root_.Get(), alpha.Get());
+  HWND first = Open(level.Get());
+  auto secondBrowser = com::Make<FakeBrowser>();
+  HWND second = Open(level.Get(), FVM_DETAILS, nullptr, secondBrowser.Get());
+  frameCommands.clear();
+  Command(first, kCmdDelete);
+  EXPECT_TRUE(frameCommands.empty()) << "nothing selected: nothing at all";
+  Select(first, 0);
+  Command(first, kCmdDelete);
+  EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"alpha"}));
+  EXPECT_TRUE(PumpUntil([&] { return frameCommands.size() >= 3; })) << "itself, then both views by the broadcast";
+  Refilled(second);
+  EXPECT_EQ(Rows(root), kRootRows) << "the root view hears only changes of the root";
+}
+
+TEST_F(View, ADeletedLevelDisappearsFromEveryViewOfTheRoot) {
+  HWND view = Open(root_.Get());
+  HWND other = Open(root_.Get());
+  Select(view, 2);
+  Command(view, kCmdDelete);
+  const Texts left = {L"Add New Digital Level", L"alpha", L"Charlie"};
+  EXPECT_TRUE(PumpUntil([&] { return Rows(other) == left; })) << "by the broadcast alone";
+  EXPECT_TRUE(PumpUntil([&] { return Rows(view) == left; }));
+}
+
+TEST_F(View, CommandTargetAnnouncesThreeCommandsInFourGroupsAndExecRunsAnyGroup) {
+  HWND view = Open(root_.Get());
+  com::ComPtr<IOleCommandTarget> target;
+  ASSERT_EQ(Last()->QueryInterface(IID_IOleCommandTarget, target.PutVoid()), S_OK);
+  OLECMD commands[] = {{OLECMDID_PROPERTIES, 9}, {OLECMDID_COPY, 9}, {OLECMDID_REFRESH, 9}, {OLECMDID_PASTE, 9},
+                       {kCmdDelete, 9}};
+  for (const GUID* group : {static_cast<const GUID*>(nullptr), &CLSID_MarlixDLShellFolder, &CGID_Explorer,
+                            &CGID_ShellDocView}) {
+    EXPECT_EQ(target->QueryStatus(group, 5, commands, nullptr), S_OK);
+    EXPECT_EQ(commands[0].cmdf, 3u);
+    EXPECT_EQ(commands[1].cmdf, 3u);
+    EXPECT_EQ(commands[2].cmdf, 3u);
+    EXPECT_EQ(commands[3].cmdf, 0u);
+    EXPECT_EQ(commands[4].cmdf, 0u);
+  }
+  EXPECT_EQ(target->QueryStatus(nullptr, 1, nullptr, nullptr), E_POINTER);
+  const GUID unknown{0x12345678, 1, 2, {3, 4, 5, 6, 7, 8, 9, 10}};
+  EXPECT_EQ(target->QueryStatus(&unknown, 5, commands, nullptr), OLECMDERR_E_UNKNOWNGROUP);
+  Select(view, 3);
+  EXPECT_EQ(target->Exec(&unknown, kCmdDelete, 0, nullptr, nullptr), S_OK);
+  EXPECT_EQ(target->Exec(&unknown, 4711, 0, nullptr, nullptr), S_OK) << "an unknown command is ignored";
+  EXPECT_EQ(Stored(), (Texts{L"Bravo", L"alpha"}));
+}
+
+TEST_F(View, MergedMenusHoldTheEntriesInTheirOrderAndStatesFreshAtEachOpening) {
+  HWND view = Open(root_.Get());
+  ParkCursorAwayFrom(view);
+  ASSERT_EQ(Last()->UIActivate(SVUIA_ACTIVATE_FOCUS), S_OK);
+  HMENU bar = browser_->shown;
+  EXPECT_EQ(Popup(bar, FCIDM_MENU_FILE), (Texts{L"-", L"Delete grey", L"Properties grey", L"Open default grey",
+                                                L"Create Digital Level", L"Close"}));
+  EXPECT_EQ(Popup(bar, FCIDM_MENU_EDIT), (Texts{L"-", L"&Copy grey", L"&Paste grey"}));
+  EXPECT_EQ(Popup(bar, FCIDM_MENU_VIEW), (Texts{L"Status Bar", L"-", L"Large Icons", L"Small Icons", L"List",
+                                                L"Details checked", L"-", L"Options"}));
+  Select(view, 2);
+  SendMessageW(view, WM_INITMENUPOPUP, 0, 0);
+  bar = browser_->shown;
+  EXPECT_EQ(Popup(bar, FCIDM_MENU_FILE)[1], L"Delete");
+  EXPECT_EQ(Popup(bar, FCIDM_MENU_FILE)[3], L"Open default");
+  EXPECT_EQ(Popup(bar, FCIDM_MENU_EDIT), (Texts{L"-", L"&Copy grey", L"&Paste"})) << "mouse not over a level";
+  RECT row{LVIR_BOUNDS};
+  SendMessageW(ListOf(view), LVM_GETITEMRECT, 1, reinterpret_cast<LPARAM>(&row));
+  POINT over{row.left + 5, (row.top + row.bottom) / 2};
+  ClientToScreen(ListOf(view), &over);
+  SetCursorPos(over.x, over.y);
+  Command(view, kCmdList);
+  EXPECT_EQ(Popup(browser_->shown, FCIDM_MENU_EDIT)[1], L"&Copy") << "a mode change rebuilds too";
+  EXPECT_EQ(Popup(browser_->shown, FCIDM_MENU_VIEW)[4], L"List checked");
+  Select(view, 0);
+  SendMessageW(view, WM_INITMENUPOPUP, 0, 0);
+  EXPECT_EQ(Popup(browser_->shown, FCIDM_MENU_FILE)[1], L"Delete grey") << "the add row selected";
+  ParkCursorAwayFrom(view);
+  Last()->UIActivate(SVUIA_ACTIVATE_NOFOCUS);
+  EXPECT_EQ(Popup(browser_->shown, FCIDM_MENU_EDIT), Texts{L"Undo"}) << "without focus the Edit menu is the browser's";
+  Last()->UIActivate(SVUIA_DEACTIVATE);
+  EXPECT_EQ(browser_->shown, nullptr);
+
+  auto dialog = com::Make<FakeBrowser>(true);
+  UniqueList alpha = MakeId(PIDL_LEVEL, L"alpha");
+  auto level = Bind(root_.Get(), alpha.Get());
+  HWND file = Open(level.Get(), FVM_DETAILS, nullptr, dialog.Get());
+  Select(file, 0);
+  Last()->UIActivate(SVUIA_ACTIVATE_FOCUS);
+  EXPECT_EQ(Popup(dialog->shown, FCIDM_MENU_FILE), (Texts{L"Select default", L"Close"}));
+  EXPECT_EQ(Popup(dialog->shown, FCIDM_MENU_EDIT), (Texts{L"-", L"&Copy", L"&Paste grey"}))
+      << "row 0 of a level is its file";
+}
+
+// Reads the context menu while it is open, from a second thread, and closes it.
+Texts ContextMenu(HWND view, POINT at) {
+  Texts entries;
+  std::thread person([&] {
+    HWND popup = nullptr;
+    if (!sheet::WaitFor([&] { return (popup = FindWindowW(L"#32768", nullptr)) && IsWindowVisible(popup); })) return;
+    entries = Entries(reinterpret_cast<HMENU>(SendMessageW(popup, MN_GETHMENU, 0, 0)));
+    PostMessageW(view, WM_CANCELMODE, 0, 0);
+  });
+  SendMessageW(view, WM_CONTEXTMENU, reinterpret_cast<WPARAM>(view), MAKELPARAM(at.x, at.y));
+  person.join();
+  return entries;
+}
+
+TEST_F(View, ContextMenuOnEmptySpaceOffersTheFolderCommandsAndModesGreyedAsNeeded) {
+  HWND view = Open(root_.Get());
+  ParkCursorAwayFrom(view);
+  EXPECT_EQ(ContextMenu(view, {300, 250}),
+            (Texts{L"Open default grey", L"-", L"Create Digital Level", L"Delete grey", L"Properties grey", L"-",
+                   L"Large Icons", L"Small Icons", L"List", L"Details checked", L"-", L"&Copy grey", L"&Paste grey"}));
+  Select(view, 1);
+  EXPECT_EQ(ContextMenu(view, {-1, -1}), (Texts{L"Open default", L"-", L"Create Digital Level", L"Delete",
+                                                L"Properties", L"-", L"&Copy grey", L"&Paste"}))
+      << "no modes with a selection";
 }
 
 }  // namespace

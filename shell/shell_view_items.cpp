@@ -1,0 +1,173 @@
+// What the view's commands do to items: create, edit and delete levels, copy and paste
+// them, and drag the virtual file out. Every command fails silently; only the property
+// sheet speaks to the user.
+#include <ole2.h>
+
+#include "base/resource_ids.h"
+#include "config/station_dialog.h"
+#include "helpers/win_handles.h"
+#include "shell/shell_folder_base.h"
+#include "shell/shell_view.h"
+#include "store/station_record.h"
+#include "store/string_table.h"
+#include "transfer/data_object.h"
+
+namespace {
+constexpr wchar_t kStationsFormat[] = L"Marlix Total Stations";
+// A paste gives up on a record whose "Copy of " names are all taken this many times over.
+constexpr int kMaxCopyPrefixes = 1000;
+
+bool LevelExists(const std::wstring& name) {
+  CStationRecord probe;
+  probe.Name = name;
+  return FindStation(probe) == S_OK;
+}
+}  // namespace
+
+std::vector<int> CMarlixDLShellView::SelectedRows() {
+  std::vector<int> rows;
+  if (!IsWindow(ListWindow)) return rows;
+  for (int row = -1; (row = static_cast<int>(SendMessageW(ListWindow, LVM_GETNEXTITEM, static_cast<WPARAM>(row),
+                                                          LVNI_SELECTED))) >= 0;)
+    rows.push_back(row);
+  return rows;
+}
+
+LPCITEMIDLIST CMarlixDLShellView::RowId(int row) {
+  LVITEMW item{};
+  item.mask = LVIF_PARAM;
+  item.iItem = row;
+  if (!IsWindow(ListWindow) || !SendMessageW(ListWindow, LVM_GETITEMW, 0, reinterpret_cast<LPARAM>(&item)))
+    return nullptr;
+  return reinterpret_cast<LPCITEMIDLIST>(item.lParam);
+}
+
+// The add row has no id, so it adds the folder's own list: a copy of the folder as an item.
+int CMarlixDLShellView::AddSelection(CMarlixDLDataObject* data) {
+  wchar_t path[MAX_PATH] = {};
+  if (FolderBase) FolderBase->GetFolderPath(path, MAX_PATH, false);
+  int last = -1;
+  for (int row : SelectedRows()) {
+    win::UniqueCoMem<ITEMIDLIST> folder(PidlMgr->CreateListFromPath(path));
+    win::UniqueCoMem<ITEMIDLIST> full(PidlMgr->Concatenate(folder.Get(), RowId(row)));
+    if (full) data->AddItem(full.Get());
+    last = row;
+  }
+  return last;
+}
+
+// The sheet stores the level itself; the view only shows the result.
+void CMarlixDLShellView::OnNewLevel() {
+  CStationRecord record;
+  record.Name = MakeUniqueStationName(LoadTranslatedString(IDS_NEW_LEVEL_NAME));
+  com::ComPtr<CMarlixDLShellView> keep(this);  // the sheet's modal loop may see the browser let go
+  INT_PTR result = 0;
+  {
+    CStationDialog sheet(nullptr, record, true);
+    result = sheet.DoModal();
+  }
+  if (result != IDOK) return;
+  RefreshAll();
+  BroadcastChange();
+}
+
+// One sheet after another while they are cancelled: an OK reloads the list, which ends the walk.
+void CMarlixDLShellView::OnProperties() {
+  if (!PidlMgr || !PidlMgr->GetLast(FolderIdList) || !IsWindow(ListWindow)) return;
+  if (!SendMessageW(ListWindow, LVM_GETSELECTEDCOUNT, 0, 0)) return;
+  com::ComPtr<CMarlixDLShellView> keep(this);
+  for (int row = -1; FolderType() == PIDL_ROOT && IsWindow(ListWindow) &&
+                     (row = static_cast<int>(SendMessageW(ListWindow, LVM_GETNEXTITEM, static_cast<WPARAM>(row),
+                                                          LVNI_SELECTED))) >= 0;) {
+    LPCITEMIDLIST id = RowId(row);
+    if (!id) continue;
+    CStationRecord record;
+    record.Name = PidlMgr->GetTextCopy(id);  // the row may be gone once the sheet has run
+    FindStation(record);  // a level deleted meanwhile opens with default values
+    INT_PTR result = 0;
+    {
+      CStationDialog sheet(nullptr, record, false);
+      result = sheet.DoModal();
+    }
+    if (result == IDOK) RefreshAll();
+  }
+  BroadcastChange();
+}
+
+// No confirmation. In a level's view nothing is deleted, yet the views are told.
+void CMarlixDLShellView::OnDelete() {
+  if (!PidlMgr || !PidlMgr->GetLast(FolderIdList) || !IsWindow(ListWindow)) return;
+  if (!SendMessageW(ListWindow, LVM_GETSELECTEDCOUNT, 0, 0)) return;
+  if (FolderType() == PIDL_ROOT) {
+    for (int row : SelectedRows()) {
+      LPCITEMIDLIST id = RowId(row);
+      if (!id) continue;
+      CStationRecord record;
+      record.Name = PidlMgr->GetTextCopy(id);
+      DeleteStation(record);
+    }
+  }
+  RefreshAll();
+  BroadcastChange();
+}
+
+// The clipboard keeps the only reference to the data object.
+void CMarlixDLShellView::OnCopy() {
+  if (!IsWindow(ListWindow) || !PidlMgr) return;
+  tagPIDLTYPE type = FolderType();
+  if (type != PIDL_ROOT && type != PIDL_LEVEL) return;
+  auto data = com::Make<CMarlixDLDataObject>();
+  if (!data || AddSelection(data.Get()) < 0) return;
+  OleSetClipboard(data.Get());
+}
+
+// Levels from the clipboard come in under a free name, "Copy of " in front as often as
+// needed; every other field as it came.
+void CMarlixDLShellView::OnPaste() {
+  com::ComPtr<IDataObject> clipboard;
+  if (FAILED(OleGetClipboard(clipboard.Put())) || !clipboard) return;
+  if (!PidlMgr || !PidlMgr->GetLast(FolderIdList)) return;
+  com::ComPtr<CMarlixDLShellView> keep(this);
+  if (FolderType() == PIDL_ROOT) {
+    FORMATETC format{static_cast<CLIPFORMAT>(RegisterClipboardFormatW(kStationsFormat)), nullptr, DVASPECT_CONTENT,
+                     -1, TYMED_HGLOBAL};
+    STGMEDIUM medium{};
+    if (clipboard->GetData(&format, &medium) == S_OK) {
+      std::vector<CStationRecord> records;
+      if (medium.tymed == TYMED_HGLOBAL) UnpackStations(medium.hGlobal, records);
+      ReleaseStgMedium(&medium);
+      const std::wstring prefix = LoadTranslatedString(IDS_COPY_OF);
+      for (CStationRecord& record : records) {
+        std::wstring name = record.Name;
+        int tries = 0;
+        while (LevelExists(name) && ++tries <= kMaxCopyPrefixes) name = prefix + name;
+        if (tries > kMaxCopyPrefixes) continue;
+        record.Name = name;
+        AddStation(record);
+      }
+      RefreshAll();
+    }
+  }
+  BroadcastChange();
+}
+
+// Only a level's view drags: its rows are virtual files, whose contents the receiver
+// asks for inside DoDragDrop, which is where the download dialog runs.
+void CMarlixDLShellView::OnBeginDrag(NMLISTVIEW*) {
+  if (FolderType() != PIDL_LEVEL || !IsWindow(ListWindow) || !PidlMgr) return;
+  auto data = com::Make<CMarlixDLDataObject>();
+  if (!data) return;
+  int last = AddSelection(data.Get());
+  if (last < 0) return;
+  com::ComPtr<CMarlixDLShellView> keep(this);
+  DragImagePos = {};
+  DragImage = reinterpret_cast<HIMAGELIST>(
+      SendMessageW(ListWindow, LVM_CREATEDRAGIMAGE, last, reinterpret_cast<LPARAM>(&DragImagePos)));
+  ClientToScreen(ListWindow, &DragImagePos);
+  POINT hotSpot{0, 0}, cursor{};
+  if (GetCursorPos(&cursor)) hotSpot = {DragImagePos.x - cursor.x, DragImagePos.y - cursor.y};
+  data->SetDragImage(DragImage, ListWindow, hotSpot);
+  DragImage = nullptr;  // the data object's now
+  DWORD effect = DROPEFFECT_NONE;
+  DoDragDrop(data.Get(), data.Get(), DROPEFFECT_COPY, &effect);
+}

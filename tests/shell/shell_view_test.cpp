@@ -49,10 +49,17 @@ int ThreadCount() {
   return count;
 }
 
-// The browser's window records the commands sent to it.
+// The browser's window records the commands sent to it. Across processes it tells how
+// often its view reloaded (kReloads), and ends a peer (kPeerDone).
 std::vector<WPARAM> frameCommands;
+constexpr UINT kReloads = WM_APP, kPeerDone = WM_APP + 1;
+bool peerDone = false;
 LRESULT CALLBACK FrameProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
   if (message == WM_COMMAND) frameCommands.push_back(wParam);
+  if (message == WM_COMMAND && wParam == kCmdBrowserRefresh)
+    SetPropW(window, L"reloads", reinterpret_cast<HANDLE>(reinterpret_cast<INT_PTR>(GetPropW(window, L"reloads")) + 1));
+  if (message == kReloads) return reinterpret_cast<LRESULT>(GetPropW(window, L"reloads"));
+  if (message == kPeerDone) peerDone = true;
   return DefWindowProcW(window, message, wParam, lParam);
 }
 
@@ -942,6 +949,108 @@ TEST_F(View, ContextMenuOnEmptySpaceOffersTheFolderCommandsAndModesGreyedAsNeede
   EXPECT_EQ(ContextMenu(view, {-1, -1}), (Texts{L"Open default", L"-", L"Create Digital Level", L"Delete",
                                                 L"Properties", L"-", L"&Copy grey", L"&Paste"}))
       << "no modes with a selection";
+}
+
+
+// ---- Across processes ----
+
+// Waits for `process` while this apartment serves the calls and messages it gets meanwhile.
+DWORD WaitServing(HANDLE process, DWORD milliseconds) {
+  DWORD index = 0, code = 99;
+  if (CoWaitForMultipleHandles(COWAIT_DISPATCH_WINDOW_MESSAGES | COWAIT_DISPATCH_CALLS, milliseconds, 1, &process,
+                               &index) != S_OK)
+    TerminateProcess(process, 99);
+  GetExitCodeProcess(process, &code);
+  return code;
+}
+
+HANDLE Start(std::wstring commandLine) {
+  STARTUPINFOW startup{sizeof(startup)};
+  PROCESS_INFORMATION info{};
+  if (!CreateProcessW(nullptr, commandLine.data(), nullptr, nullptr, FALSE, 0, nullptr, nullptr, &startup, &info))
+    return nullptr;
+  CloseHandle(info.hThread);
+  return info.hProcess;
+}
+
+// This test program again, as the peer below: a view of the root and one of a level,
+// each in a browser of its own, over the store of this process.
+struct Peer {
+  explicit Peer(const std::wstring& store) {
+    wchar_t exe[MAX_PATH] = {};
+    GetModuleFileNameW(nullptr, exe, MAX_PATH);
+    SetEnvironmentVariableW(L"MARLIX_VIEW_PEER_STORE", store.c_str());
+    process = Start(L"\"" + std::wstring(exe) + L"\" --gtest_also_run_disabled_tests --gtest_filter=View.DISABLED_Peer");
+    SetEnvironmentVariableW(L"MARLIX_VIEW_PEER_STORE", nullptr);
+    PumpUntil([&] {
+      root = FindWindowW(L"ViewTestFrame", L"peer root");
+      level = FindWindowW(L"ViewTestFrame", L"peer level");
+      return root && level && RootRows() == 4;
+    }, 30);
+  }
+  ~Peer() {
+    if (!process) return;
+    PostMessageW(root, kPeerDone, 0, 0);
+    EXPECT_EQ(WaitServing(process, 20000), 0u) << "the peer's own checks";
+    CloseHandle(process);
+  }
+  HWND RootView() const { return FindWindowExW(root, nullptr, kViewWindowClass, nullptr); }
+  int RootRows() const { return static_cast<int>(SendMessageW(ListOf(RootView()), LVM_GETITEMCOUNT, 0, 0)); }
+  LRESULT LevelReloads() const { return SendMessageW(level, kReloads, 0, 0); }
+
+  HANDLE process = nullptr;
+  HWND root = nullptr, level = nullptr;
+};
+
+TEST_F(View, DISABLED_Peer) {
+  wchar_t store[MAX_PATH] = {};
+  if (!GetEnvironmentVariableW(L"MARLIX_VIEW_PEER_STORE", store, MAX_PATH)) GTEST_SKIP() << "only as a peer";
+  RegOverridePredefKey(HKEY_CURRENT_USER, nullptr);
+  HKEY shared = nullptr;
+  ASSERT_EQ(RegOpenKeyExW(HKEY_CURRENT_USER, store, 0, KEY_ALL_ACCESS, &shared), ERROR_SUCCESS);
+  RegOverridePredefKey(HKEY_CURRENT_USER, shared);
+  Open(root_.Get());
+  UniqueList alpha = MakeId(PIDL_LEVEL, L"alpha");
+  auto level = Bind(root_.Get(), alpha.Get());
+  auto levelBrowser = com::Make<FakeBrowser>();
+  Open(level.Get(), FVM_DETAILS, nullptr, levelBrowser.Get());
+  SetWindowTextW(levelBrowser->frame, L"peer level");
+  SetWindowTextW(browser_->frame, L"peer root");
+  EXPECT_TRUE(PumpUntil([] { return peerDone; }, 60));
+  for (auto& view : views_) view->DestroyViewWindow();
+  views_.clear();
+  RegOverridePredefKey(HKEY_CURRENT_USER, nullptr);
+  RegCloseKey(shared);
+}
+
+TEST_F(View, AnotherProcessSeesChangesByTheBroadcastAloneAndPastesWhatWasCopiedHere) {
+  CStationRecord full;
+  full.Name = L"alpha";
+  FindStation(full);
+  full.Port = 5, full.BaudRate = 4800, full.Parity = 2, full.Manufacturer = L"north line", full.Model = L"HRB1X";
+  ASSERT_EQ(UpdateStation(L"alpha", full), S_OK);
+  HWND view = Open(root_.Get());
+  Peer peer(sandbox_.ScratchPath(HKEY_CURRENT_USER));
+  ASSERT_EQ(peer.RootRows(), 4);
+  const LRESULT levelReloads = peer.LevelReloads();
+  Select(view, 3);
+  Command(view, kCmdDelete);
+  EXPECT_TRUE(PumpUntil([&] { return peer.RootRows() == 3; })) << "deleted here, gone there";
+  AnswerSheets([&] { Command(view, kCmdNewLevel); }, {IDOK});
+  EXPECT_TRUE(PumpUntil([&] { return peer.RootRows() == 4; })) << "created here, shown there";
+  Refilled(view);
+  Select(view, 1);
+  Command(view, kCmdCopy);
+  PostMessageW(peer.RootView(), WM_COMMAND, kCmdPaste, 0);
+  EXPECT_TRUE(PumpUntil([&] { return peer.RootRows() == 5 && Rows(view).size() == 5; })) << "pasted there, shown here";
+  PostMessageW(peer.RootView(), WM_COMMAND, kCmdPaste, 0);
+  EXPECT_TRUE(PumpUntil([&] { return Rows(view).size() == 6; }));
+  auto levels = sheet::StoredLevels();
+  for (const wchar_t* copy : {L"Copy of alpha|5|4800|1|2|8|0|1|north line|HRB1X",
+                              L"Copy of Copy of alpha|5|4800|1|2|8|0|1|north line|HRB1X"})
+    EXPECT_NE(std::find(levels.begin(), levels.end(), copy), levels.end()) << testing::PrintToString(copy);
+  EXPECT_EQ(peer.LevelReloads(), levelReloads) << "a view of a level doesn't reload for the root";
+  OleSetClipboard(nullptr);
 }
 
 }  // namespace

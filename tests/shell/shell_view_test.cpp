@@ -23,6 +23,10 @@
 #include "shell/shell_view.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
+// The transfer tests' helpers name their id list builder as the shell's do their id list type.
+#define IdList TransferIdList
+#include "transfer/data_test_support.h"
+#undef IdList
 
 namespace {
 using Texts = std::vector<std::wstring>;
@@ -954,12 +958,13 @@ TEST_F(View, ContextMenuOnEmptySpaceOffersTheFolderCommandsAndModesGreyedAsNeede
 
 // ---- Across processes ----
 
-// Waits for `process` while this apartment serves the calls and messages it gets meanwhile.
-DWORD WaitServing(HANDLE process, DWORD milliseconds) {
-  DWORD index = 0, code = 99;
-  if (CoWaitForMultipleHandles(COWAIT_DISPATCH_WINDOW_MESSAGES | COWAIT_DISPATCH_CALLS, milliseconds, 1, &process,
-                               &index) != S_OK)
+// Waits for `process` while this thread goes on dispatching input, messages and the
+// calls that come in as messages; ends the process if it takes longer.
+DWORD WaitServing(HANDLE process, double seconds) {
+  DWORD code = 99;
+  if (!PumpUntil([&] { return WaitForSingleObject(process, 0) == WAIT_OBJECT_0; }, seconds))
     TerminateProcess(process, 99);
+  WaitForSingleObject(process, 5000);
   GetExitCodeProcess(process, &code);
   return code;
 }
@@ -991,7 +996,7 @@ struct Peer {
   ~Peer() {
     if (!process) return;
     PostMessageW(root, kPeerDone, 0, 0);
-    EXPECT_EQ(WaitServing(process, 20000), 0u) << "the peer's own checks";
+    EXPECT_EQ(WaitServing(process, 20), 0u) << "the peer's own checks";
     CloseHandle(process);
   }
   HWND RootView() const { return FindWindowExW(root, nullptr, kViewWindowClass, nullptr); }
@@ -1051,6 +1056,64 @@ TEST_F(View, AnotherProcessSeesChangesByTheBroadcastAloneAndPastesWhatWasCopiedH
     EXPECT_NE(std::find(levels.begin(), levels.end(), copy), levels.end()) << testing::PrintToString(copy);
   EXPECT_EQ(peer.LevelReloads(), levelReloads) << "a view of a level doesn't reload for the root";
   OleSetClipboard(nullptr);
+}
+
+
+// Real input, as the mouse gives it: `flags` at a screen point.
+void Mouse(DWORD flags, POINT at) {
+  INPUT input{INPUT_MOUSE};
+  input.mi.dx = at.x * 65535 / (GetSystemMetrics(SM_CXSCREEN) - 1);
+  input.mi.dy = at.y * 65535 / (GetSystemMetrics(SM_CYSCREEN) - 1);
+  input.mi.dwFlags = flags | MOUSEEVENTF_MOVE | MOUSEEVENTF_ABSOLUTE;
+  SendInput(1, &input, sizeof(input));
+}
+
+// What a surveyor does: presses the mouse on file1.tkf in a level's view, moves to a
+// window of another process that takes virtual files as Explorer does, and lets go.
+// The download runs here, inside the drag; the file lands there.
+TEST_F(View, DraggingTheFileToAnotherProcessDownloadsItThere) {
+  UniqueList alpha = MakeId(PIDL_LEVEL, L"alpha");
+  auto level = Bind(root_.Get(), alpha.Get());
+  HWND view = Open(level.Get());
+  SetWindowPos(browser_->frame, HWND_TOPMOST, 0, 0, 600, 400, SWP_SHOWWINDOW);
+  const std::wstring folder = TempDir() + L"dropped";
+  CreateDirectoryW(folder.c_str(), nullptr);
+  wchar_t exe[MAX_PATH] = {};
+  GetModuleFileNameW(nullptr, exe, MAX_PATH);
+  std::wstring receiverExe = exe;
+  receiverExe = receiverExe.substr(0, receiverExe.find_last_of(L'\\')) + L"\\..\\bin\\shell_peer.exe";
+  HANDLE receiver = Start(L"\"" + receiverExe + L"\" drop \"" + folder + L"\" 700 500 60");
+  ASSERT_TRUE(receiver);
+  HWND target = nullptr;
+  ASSERT_TRUE(PumpUntil([&] { return (target = FindWindowW(L"MarlixShellPeer", L"Receiver")) && IsWindowVisible(target); }, 20));
+  RECT row{LVIR_LABEL};
+  SendMessageW(ListOf(view), LVM_GETITEMRECT, 0, reinterpret_cast<LPARAM>(&row));
+  POINT from{row.left + 10, (row.top + row.bottom) / 2}, to{800, 575};
+  ClientToScreen(ListOf(view), &from);
+  DialogDriver driver(IDC_TRANSFER_START, {}, 60000);
+  std::thread hand([&] {
+    Mouse(0, from);
+    Sleep(200);
+    Mouse(MOUSEEVENTF_LEFTDOWN, from);
+    for (int i = 1; i <= 20; ++i) {
+      Sleep(50);
+      Mouse(0, {from.x + (to.x - from.x) * i / 20, from.y + (to.y - from.y) * i / 20});
+    }
+    Sleep(200);
+    Mouse(MOUSEEVENTF_LEFTUP, to);
+  });
+  DWORD code = WaitServing(receiver, 60);
+  hand.join();
+  CloseHandle(receiver);
+  EXPECT_TRUE(driver.Finish()) << "the download dialog came up and Start was pressed";
+  EXPECT_EQ(code, 0u) << "the receiver wrote every file it was offered";
+  std::vector<char> bytes;
+  if (FILE* file = _wfopen((folder + L"\\file1.tkf").c_str(), L"rb")) {
+    for (int c; (c = std::fgetc(file)) != EOF;) bytes.push_back(static_cast<char>(c));
+    std::fclose(file);
+  }
+  EXPECT_TRUE(IsStandInJob(bytes)) << bytes.size() << " bytes";
+  SetWindowPos(browser_->frame, HWND_NOTOPMOST, 0, 0, 0, 0, SWP_NOMOVE | SWP_NOSIZE | SWP_HIDEWINDOW);
 }
 
 }  // namespace

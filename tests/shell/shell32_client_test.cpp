@@ -150,6 +150,17 @@ TEST(ExplorerBrowserClient, ShowsTheLevelsAndMovesIntoALevelWhenItIsActivated) {
   SHGetSettings(&shell, SSF_DOUBLECLICKINWEBVIEW | SSF_WIN95CLASSIC);
   EXPECT_EQ(ListView_GetExtendedListViewStyle(list), (shell.fWin95Classic || shell.fDoubleClickInWebView) ? 0u : 0x848u)
       << "the user's click setting";
+  // Wine's browser merges no menus (it answers E_NOTIMPL and inserts no popups), so the
+  // view tests read the merged menus back in a browser of their own.
+  com::ComPtr<IShellBrowser> shellBrowser;
+  ASSERT_EQ(browser->QueryInterface(IID_IShellBrowser, shellBrowser.PutVoid()), S_OK);
+  HMENU probe = CreateMenu();
+  OLEMENUGROUPWIDTHS widths{};
+  EXPECT_EQ(shellBrowser->InsertMenusSB(probe, &widths), E_NOTIMPL);
+  EXPECT_EQ(GetMenuItemCount(probe), 0);
+  EXPECT_EQ(shellBrowser->SetMenuSB(probe, nullptr, nullptr), E_NOTIMPL);
+  DestroyMenu(probe);
+  shellBrowser.Reset();
   com::ComPtr<IShellView> view;
   ASSERT_EQ(browser->GetCurrentView(IID_IShellView, view.PutVoid()), S_OK);
   com::ComPtr<IOleCommandTarget> commands;

@@ -1075,26 +1075,34 @@ TEST_F(View, DraggingTheFileToAnotherProcessDownloadsItThere) {
   UniqueList alpha = MakeId(PIDL_LEVEL, L"alpha");
   auto level = Bind(root_.Get(), alpha.Get());
   HWND view = Open(level.Get());
-  SetWindowPos(browser_->frame, HWND_TOPMOST, 0, 0, 600, 400, SWP_SHOWWINDOW);
+  // Away from the screen's middle, where other programs' dialogs come up.
+  SetWindowPos(browser_->frame, HWND_TOPMOST, 0, 600, 600, 400, SWP_SHOWWINDOW);
   const std::wstring folder = TempDir() + L"dropped";
   CreateDirectoryW(folder.c_str(), nullptr);
   wchar_t exe[MAX_PATH] = {};
   GetModuleFileNameW(nullptr, exe, MAX_PATH);
   std::wstring receiverExe = exe;
   receiverExe = receiverExe.substr(0, receiverExe.find_last_of(L'\\')) + L"\\..\\bin\\shell_peer.exe";
-  HANDLE receiver = Start(L"\"" + receiverExe + L"\" drop \"" + folder + L"\" 700 500 60");
+  HANDLE receiver = Start(L"\"" + receiverExe + L"\" drop \"" + folder + L"\" 1000 100 60");
   ASSERT_TRUE(receiver);
-  HWND target = nullptr;
-  ASSERT_TRUE(PumpUntil([&] { return (target = FindWindowW(L"MarlixShellPeer", L"Receiver")) && IsWindowVisible(target); }, 20));
   RECT row{LVIR_LABEL};
   SendMessageW(ListOf(view), LVM_GETITEMRECT, 0, reinterpret_cast<LPARAM>(&row));
-  POINT from{row.left + 10, (row.top + row.bottom) / 2}, to{800, 575};
+  POINT from{row.left + 10, (row.top + row.bottom) / 2}, to{1100, 175};
+  ASSERT_TRUE(PumpUntil([&] {
+    DWORD owner = 0;
+    GetWindowThreadProcessId(WindowFromPoint(to), &owner);
+    return owner == GetProcessId(receiver);
+  }, 20)) << "the receiver's window is up";
   ClientToScreen(ListOf(view), &from);
   DialogDriver driver(IDC_TRANSFER_START, {}, 60000);
   std::thread hand([&] {
     Mouse(0, from);
     Sleep(200);
     Mouse(MOUSEEVENTF_LEFTDOWN, from);
+    for (int dx : {4, 8, 12}) {  // past the list's drag threshold while still inside it
+      Sleep(50);
+      Mouse(0, {from.x + dx, from.y});
+    }
     for (int i = 1; i <= 20; ++i) {
       Sleep(50);
       Mouse(0, {from.x + (to.x - from.x) * i / 20, from.y + (to.y - from.y) * i / 20});

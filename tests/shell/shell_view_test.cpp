@@ -647,7 +647,7 @@ Texts AnswerSheets(const std::function<void()>& action, std::vector<int> buttons
   return names;
 }
 
-// Names of the stored levels, in store order.
+// Names of the stored levels, sorted.
 Texts Stored() {
   Texts names;
   for (const std::wstring& line : sheet::StoredLevels()) names.push_back(line.substr(0, line.find(L'|')));
@@ -833,7 +833,7 @@ TEST_F(View, PasteTakesWholeRecordsOnlyAndNothingFromAnEmptyOrForeignClipboard) 
   OleSetClipboard(nullptr);
 }
 
-TEST_F(View, DeleteInALevelsViewDeletesNothingYetEveryViewOfALevelReloads) {
+TEST_F(View, DeleteAndPasteInALevelsViewChangeNothingYetEveryViewOfALevelReloads) {
   HWND root = Open(root_.Get());
   UniqueList alpha = MakeId(PIDL_LEVEL, L"alpha");
   auto level = Bind(root_.Get(), alpha.Get());
@@ -846,7 +846,11 @@ TEST_F(View, DeleteInALevelsViewDeletesNothingYetEveryViewOfALevelReloads) {
   Select(first, 0);
   Command(first, kCmdDelete);
   EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"alpha"}));
-  EXPECT_TRUE(PumpUntil([&] { return frameCommands.size() >= 3; })) << "itself, then both views by the broadcast";
+  ClipStations(SIZE_MAX);
+  Command(first, kCmdPaste);
+  EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"alpha"})) << "levels are pasted in the root only";
+  OleSetClipboard(nullptr);
+  EXPECT_TRUE(PumpUntil([&] { return frameCommands.size() >= 5; })) << "delete: itself, and both by its broadcast; paste: both by its broadcast";
   Refilled(second);
   EXPECT_EQ(Rows(root), kRootRows) << "the root view hears only changes of the root";
 }

@@ -1,9 +1,11 @@
 #!/usr/bin/env bash
 # The installer under Wine, in a fresh prefix: silent install, shell32 reaching the folder,
 # upgrade, practice instrument, uninstall, and a maker's MarlixComm.dll never overwritten.
+# With the practice instrument installed, the whole road of one download runs on the product.
 # Usage: installer_test.sh <installer> <shell probe> <stand-in dll> <version> <prefix>
+#                          <download road> <shell peer> <road folder>
 set -u
-installer="$1" probe="$2" standin="$3" version="$4"
+installer="$1" probe="$2" standin="$3" version="$4" road="$6" peer="$7" road_dir="$8"
 root=$(cd "$(dirname "$0")/../.." && pwd)
 export WINEPREFIX="$5" WINEDEBUG=-all
 rm -rf "$WINEPREFIX"
@@ -45,6 +47,17 @@ expect_count "folder under My Computer after an upgrade" "$(count 'computer: Mar
 expect_count "Add/Remove entries after an upgrade" "$(query "$uninstall_key" /s | grep -c 'DisplayName.*Marlix Digital Levels')" 1
 query "$folder_key\\InprocServer32" /ve | grep -qF 'C:\Program Files\Marlix Digital Levels\MarlixDLShellExt.dll' ||
   fail "the registration does not name the installed module"
+
+# The road: the add row, the sheet, the new level, its file dragged to another program and
+# downloaded from the practice instrument; a picture of the screen after each step.
+windows() { printf 'Z:%s' "${1//\//\\}"; }
+rm -rf "$road_dir"
+mkdir -p "$road_dir/received" "$road_dir/screens"
+start=$(date +%s)
+run "$road" "$(windows "$peer")" "$(windows "$road_dir/received")" "$(windows "$road_dir/screens")" ||
+  fail "the download road"
+echo "the download road took $(( $(date +%s) - start )) s"
+for shot in "$road_dir"/screens/*.bmp; do /usr/bin/convert "$shot" "${shot%.bmp}.png" && rm "$shot"; done
 
 uninstall
 [ -e "$target" ] && fail "files left behind: $(ls "$target")"

@@ -133,6 +133,7 @@ Section "Uninstall"
   ReadRegDWORD $1 HKLM "${UNINSTALL_KEY}" "PracticeInstrument"
   ${If} $1 == 1
     Delete /REBOOTOK "$INSTDIR\MarlixComm.dll"
+    Delete "$INSTDIR\MarlixComm.log"  ; the practice instrument's record of its calls
   ${EndIf}
   Delete "$INSTDIR\Uninstall.exe"
   RMDir "$INSTDIR"

@@ -1,0 +1,286 @@
+// The whole road of one download on the installed product, as a surveyor takes it:
+// Wine's ExplorerBrowser opens "Marlix Digital Levels", the add row opens the property
+// sheet, a new level is saved and opened, and file1.tkf is dragged to another program's
+// window, which takes it as Explorer would; the download dialog shows the level's
+// instructions, Start is pressed and the practice instrument sends its job.
+// Every action is real mouse input or a key typed into a control, from a second thread
+// while this one runs the browser; nothing of ours stands between the steps.
+//   download_road <shell_peer.exe> <receiving folder> <screenshot folder> [pause ms]
+// Says each step on the terminal, saves a picture of the screen after each (BMP), and
+// exits 0 only if the job arrived whole and no temporary file stayed behind.
+#include <windows.h>
+#include <commctrl.h>
+#include <shellapi.h>
+#include <shlobj.h>
+
+#include <atomic>
+#include <set>
+#include <cstdio>
+#include <functional>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "base/resource_ids.h"
+#include "store/string_table.h"
+#include "transfer/data_test_support.h"
+
+namespace {
+
+const wchar_t kFolder[] = L"::{20D04FE0-3AEA-1069-A2D8-08002B30309D}\\::{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}";
+const wchar_t kLevel[] = L"Road Level";
+std::wstring g_shots;
+int g_pause = 0;
+int g_shot = 0;
+int g_failures = 0;
+
+void Say(const char* text) {
+  std::printf("road: %s\n", text);
+  std::fflush(stdout);
+}
+void Check(bool ok, const char* what) {
+  if (!ok) std::printf("FAIL: %s\n", what), ++g_failures;
+}
+
+// A picture of the screen's top left 1024x768 as a 24-bit BMP.
+void Shot(const wchar_t* name) {
+  const int width = 1024, height = 768;
+  HDC screen = GetDC(nullptr), memory = CreateCompatibleDC(screen);
+  BITMAPINFOHEADER header{sizeof(header), width, height, 1, 24, BI_RGB};
+  void* bits = nullptr;
+  HBITMAP bitmap = CreateDIBSection(screen, reinterpret_cast<BITMAPINFO*>(&header), DIB_RGB_COLORS, &bits, nullptr, 0);
+  HGDIOBJ old = SelectObject(memory, bitmap);
+  BitBlt(memory, 0, 0, width, height, screen, 0, 0, SRCCOPY);
+  GdiFlush();
+  const DWORD size = width * 3 * height;
+  BITMAPFILEHEADER file{0x4D42, DWORD(sizeof(BITMAPFILEHEADER) + sizeof(header) + size), 0, 0,
+                        DWORD(sizeof(BITMAPFILEHEADER) + sizeof(header))};
+  wchar_t path[MAX_PATH];
+  swprintf(path, MAX_PATH, L"%ls\\%02d-%ls.bmp", g_shots.c_str(), ++g_shot, name);
+  if (FILE* out = _wfopen(path, L"wb")) {
+    std::fwrite(&file, sizeof(file), 1, out);
+    std::fwrite(&header, sizeof(header), 1, out);
+    std::fwrite(bits, 1, size, out);
+    std::fclose(out);
+  }
+  SelectObject(memory, old);
+  DeleteObject(bitmap);
+  DeleteDC(memory);
+  ReleaseDC(nullptr, screen);
+}
+
+// This thread's side: messages, input and the calls of other processes go on.
+bool Pump(const std::function<bool()>& done, DWORD milliseconds = 30000) {
+  for (DWORD start = GetTickCount(); !done();) {
+    if (GetTickCount() - start > milliseconds) return false;
+    MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT);
+    for (MSG msg; PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE);) {
+      TranslateMessage(&msg);
+      DispatchMessageW(&msg);
+    }
+  }
+  return true;
+}
+
+// The person's side, on a thread of its own: waits without pumping.
+template <class Condition>
+bool WaitFor(Condition condition, DWORD milliseconds = 30000) {
+  for (DWORD start = GetTickCount(); !condition(); Sleep(20))
+    if (GetTickCount() - start > milliseconds) return false;
+  return true;
+}
+
+void Mouse(DWORD flags, POINT at) {
+  INPUT input{INPUT_MOUSE};
+  input.mi.dx = at.x * 65535 / (GetSystemMetrics(SM_CXSCREEN) - 1);
+  input.mi.dy = at.y * 65535 / (GetSystemMetrics(SM_CYSCREEN) - 1);
+  input.mi.dwFlags = flags | MOUSEEVENTF_MOVE | MOUSEEVENTF_ABSOLUTE;
+  SendInput(1, &input, sizeof(input));
+}
+void Click(POINT at, int times = 1) {
+  Mouse(0, at);
+  Sleep(100);
+  for (int i = 0; i < times; ++i) {
+    Mouse(MOUSEEVENTF_LEFTDOWN, at);
+    Mouse(MOUSEEVENTF_LEFTUP, at);
+    Sleep(50);
+  }
+}
+POINT Centre(HWND window) {
+  RECT rect{};
+  GetWindowRect(window, &rect);
+  return {(rect.left + rect.right) / 2, (rect.top + rect.bottom) / 2};
+}
+
+// The list of the browser's current view.
+HWND CurrentList(IExplorerBrowser* browser) {
+  IShellView* view = nullptr;
+  HWND window = nullptr;
+  if (FAILED(browser->GetCurrentView(IID_IShellView, reinterpret_cast<void**>(&view)))) return nullptr;
+  view->GetWindow(&window);
+  view->Release();
+  return GetDlgItem(window, 2000);
+}
+int RowOf(HWND list, const wchar_t* text) {
+  for (int row = 0; row < ListView_GetItemCount(list); ++row) {
+    wchar_t shown[MAX_PATH] = {};
+    ListView_GetItemText(list, row, 0, shown, MAX_PATH);
+    if (std::wstring(shown) == text) return row;
+  }
+  return -1;
+}
+POINT RowPoint(HWND list, int row) {
+  RECT rect{LVIR_LABEL};
+  SendMessageW(list, LVM_GETITEMRECT, row, reinterpret_cast<LPARAM>(&rect));
+  POINT point{rect.left + 12, (rect.top + rect.bottom) / 2};
+  ClientToScreen(list, &point);
+  return point;
+}
+
+// A visible dialog of this process with a child of id `control`.
+HWND DialogWith(int control) {
+  DWORD process = 0;
+  for (HWND found = nullptr; (found = FindWindowExW(nullptr, found, L"#32770", nullptr));)
+    if (IsWindowVisible(found) && GetWindowThreadProcessId(found, &process) && process == GetCurrentProcessId() &&
+        GetDlgItem(found, control))
+      return found;
+  return nullptr;
+}
+
+void Type(HWND edit, const wchar_t* text) {
+  SendMessageW(edit, EM_SETSEL, 0, -1);
+  for (const wchar_t* c = text; *c; ++c) SendMessageW(edit, WM_CHAR, *c, 0);
+}
+
+int Road(const std::wstring& peer, const std::wstring& receiving) {
+  const std::set<std::wstring> temporaryBefore = TransferFiles();
+  HWND frame = CreateWindowExW(0, L"STATIC", L"Marlix Digital Levels", WS_POPUP | WS_VISIBLE | WS_BORDER, 0, 0, 600,
+                               420, nullptr, nullptr, nullptr, nullptr);
+  IExplorerBrowser* browser = nullptr;
+  if (FAILED(CoCreateInstance(CLSID_ExplorerBrowser, nullptr, CLSCTX_INPROC_SERVER, IID_IExplorerBrowser,
+                              reinterpret_cast<void**>(&browser))))
+    return Say("no ExplorerBrowser"), 1;
+  RECT rect{0, 0, 600, 420};
+  FOLDERSETTINGS settings{FVM_DETAILS, 0};
+  browser->Initialize(frame, &rect, &settings);
+
+  Say("1. Wine's ExplorerBrowser opens My Computer\\Marlix Digital Levels");
+  LPITEMIDLIST folder = nullptr;
+  Check(SHParseDisplayName(kFolder, nullptr, &folder, 0, nullptr) == S_OK, "the folder's address parses");
+  Check(browser->BrowseToIDList(folder, SBSP_ABSOLUTE) == S_OK, "the browser opens the folder");
+  CoTaskMemFree(folder);
+  HWND root = nullptr;
+  Check(Pump([&] { return (root = CurrentList(browser)) && RowOf(root, L"Add New Digital Level") == 0; }),
+        "the root lists the add row first");
+  Pump([] { return false; }, 300 + g_pause);
+  Shot(L"folder");
+
+  std::atomic<int> step{0};
+  std::wstring instructions;
+  std::thread person([&] {
+    Say("2. A double click on \"Add New Digital Level\" opens the property sheet");
+    Click(RowPoint(root, 0), 2);
+    HWND sheet = nullptr;
+    if (!WaitFor([&] { return (sheet = DialogWith(IDOK)) && PropSheet_GetCurrentPageHwnd(sheet); })) return;
+    HWND page = PropSheet_GetCurrentPageHwnd(sheet);
+    Type(GetDlgItem(page, IDC_STATION_NAME), kLevel);
+    Type(GetDlgItem(page, IDC_STATION_NOTE), L"Practice instrument");
+    HWND models = GetDlgItem(page, IDC_STATION_MODEL);
+    SendMessageW(models, CB_SETCURSEL, SendMessageW(models, CB_FINDSTRINGEXACT, WPARAM(-1),
+                                                      LPARAM(LoadTranslatedString(IDS_MODEL_HRB1X).c_str())), 0);
+    SendMessageW(page, WM_COMMAND, MAKEWPARAM(IDC_STATION_MODEL, CBN_SELCHANGE), LPARAM(models));
+    Sleep(300 + g_pause);
+    Shot(L"sheet");
+    Say("   the sheet is filled in and closed with OK");
+    Click(Centre(GetDlgItem(sheet, IDOK)));
+    step = 1;
+    if (!WaitFor([&] { return step == 2; })) return;
+    Say("4. A double click on the new level opens it");
+    Click(RowPoint(root, RowOf(root, kLevel)), 2);
+    if (!WaitFor([&] { return step == 3; })) return;
+    HWND list = CurrentList(browser);
+    Say("5. file1.tkf is dragged to a folder window of another program");
+    POINT from = RowPoint(list, 0), to{800, 175};
+    Mouse(0, from);
+    Sleep(200);
+    Mouse(MOUSEEVENTF_LEFTDOWN, from);
+    for (int i = 1; i <= 20; ++i) {
+      Sleep(40);
+      Mouse(0, {from.x + (to.x - from.x) * i / 20, from.y + (to.y - from.y) * i / 20});
+    }
+    Sleep(200);
+    Mouse(MOUSEEVENTF_LEFTUP, to);
+    HWND dialog = nullptr;
+    if (!WaitFor([&] { return (dialog = DialogWith(IDC_TRANSFER_START)); })) return;
+    wchar_t text[2048] = {};
+    GetDlgItemTextW(dialog, IDC_TRANSFER_INSTRUCTIONS, text, 2048);
+    instructions = text;
+    Sleep(300 + g_pause);
+    Shot(L"download");
+    Say("6. The download dialog shows the level's instructions; Start is pressed");
+    Click(Centre(GetDlgItem(dialog, IDC_TRANSFER_START)));
+    step = 4;
+  });
+
+  Check(Pump([&] { return step == 1; }), "the sheet came up and was closed with OK");
+  Check(Pump([&] { return RowOf(root, kLevel) > 0; }), "the new level appears in the folder");
+  Say("3. The new level appears");
+  Pump([] { return false; }, 300 + g_pause);
+  Shot(L"level-added");
+  step = 2;
+  Check(Pump([&] {
+    HWND list = CurrentList(browser);
+    return list && list != root && RowOf(list, L"file1.tkf") == 0;
+  }), "the level opens and shows file1.tkf");
+  Pump([] { return false; }, 300 + g_pause);
+  Shot(L"level-opened");
+
+  std::wstring command = L"\"" + peer + L"\" drop \"" + receiving + L"\" 700 100 60";
+  STARTUPINFOW startup{sizeof(startup)};
+  PROCESS_INFORMATION receiver{};
+  Check(CreateProcessW(nullptr, command.data(), nullptr, nullptr, FALSE, 0, nullptr, nullptr, &startup, &receiver),
+        "the receiving program starts");
+  Pump([] { return FindWindowW(L"MarlixShellPeer", L"Receiver") != nullptr; });
+  step = 3;
+  Check(Pump([&] { return WaitForSingleObject(receiver.hProcess, 0) == WAIT_OBJECT_0; }, 90000),
+        "the receiving program took the file and ended");
+  DWORD code = 99;
+  GetExitCodeProcess(receiver.hProcess, &code);
+  CloseHandle(receiver.hProcess);
+  CloseHandle(receiver.hThread);
+  person.join();
+  Check(step == 4, "the download dialog came up and Start was pressed");
+  Check(instructions.find(LoadTranslatedString(IDS_INSTRUCTIONS_HRB1X)) != std::wstring::npos,
+        "the dialog shows the instructions of the level's model");
+  Check(code == 0, "the receiver wrote every file it was offered");
+  Say("7. The practice instrument's job lies in the receiving folder as file1.tkf");
+  std::vector<char> job;
+  if (FILE* in = _wfopen((receiving + L"\\file1.tkf").c_str(), L"rb")) {
+    for (int c; (c = std::fgetc(in)) != EOF;) job.push_back(char(c));
+    std::fclose(in);
+  }
+  Check(IsStandInJob(job), "file1.tkf is the practice instrument's job");
+  Check(TransferFiles() == temporaryBefore, "the temporary .txt file is gone");
+  Shot(L"done");
+  browser->Destroy();
+  browser->Release();
+  DestroyWindow(frame);
+  return g_failures;
+}
+
+}  // namespace
+
+int main() {
+  int argc = 0;
+  wchar_t** argv = CommandLineToArgvW(GetCommandLineW(), &argc);
+  if (argc < 4) return std::printf("usage: download_road <shell_peer> <receiving folder> <shots> [pause ms]\n"), 2;
+  g_shots = argv[3];
+  g_pause = argc > 4 ? _wtoi(argv[4]) : 0;
+  CreateDirectoryW(argv[2], nullptr);
+  CreateDirectoryW(argv[3], nullptr);
+  OleInitialize(nullptr);
+  int failures = Road(argv[1], argv[2]);
+  OleUninitialize();
+  std::printf("%d passed, %d failed\n", failures ? 0 : 1, failures ? 1 : 0);
+  return failures ? 1 : 0;
+}

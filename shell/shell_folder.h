@@ -12,16 +12,10 @@
 #include "transfer/data_object.h"
 #include "transfer/drop_target.h"
 
-// The classes the folder hands out that live elsewhere; each becomes its real class
-// here once it is in the module.
-using MarlixDLShellViewClass = CMarlixDLShellView;
-using MarlixDLDataObjectClass = CMarlixDLDataObject;
-using MarlixDLDropTargetClass = CMarlixDLDropTarget;
-
 class CMarlixDLShellFolder
-    : public CGravonShellFolderImpl<CMarlixDLShellFolder, MarlixDLShellViewClass, CMarlixDLEnumIDList,
+    : public CGravonShellFolderImpl<CMarlixDLShellFolder, CMarlixDLShellView, CMarlixDLEnumIDList,
                                     CMarlixDLContextMenu, CMarlixDLExtractIcon, CMarlixDLQueryInfo,
-                                    MarlixDLDataObjectClass, MarlixDLDropTargetClass> {
+                                    CMarlixDLDataObject, CMarlixDLDropTarget> {
  public:
   CMarlixDLShellFolder();
 

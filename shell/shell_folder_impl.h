@@ -8,9 +8,6 @@
 #include "base/boundary.h"
 #include "shell/shell_folder_base.h"
 
-// Stands in for a class the module doesn't have yet: asking for it fails plainly.
-struct CClassNotAvailable {};
-
 // What the classes must offer (all are com::ComObject classes, made by com::Make):
 //   TFolder       the folder itself, positioned by Init(parent, list)
 //   TView         Init(IShellFolder* folder, LPCITEMIDLIST folderList)
@@ -74,15 +71,11 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
  private:
   HRESULT CreateViewObjectOf(REFIID riid, void** result) {
     if (riid == IID_IShellView) {
-      if constexpr (std::is_same_v<TView, CClassNotAvailable>) {
-        return CLASS_E_CLASSNOTAVAILABLE;
-      } else {
-        auto view = com::Make<TView>();
-        if (!view) return E_OUTOFMEMORY;
-        HRESULT hr = view->Init(static_cast<IShellFolder*>(this), m_list);
-        if (FAILED(hr)) return hr;
-        return view->QueryInterface(riid, result);
-      }
+      auto view = com::Make<TView>();
+      if (!view) return E_OUTOFMEMORY;
+      HRESULT hr = view->Init(static_cast<IShellFolder*>(this), m_list);
+      if (FAILED(hr)) return hr;
+      return view->QueryInterface(riid, result);
     }
     if (riid == IID_IContextMenu) {
       auto menu = com::Make<TContextMenu>();
@@ -105,30 +98,26 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
 
   template <class T, class Attach>
   HRESULT MakeItemObject(LPCITEMIDLIST item, REFIID riid, void** result, Attach attach) {
-    if constexpr (std::is_same_v<T, CClassNotAvailable>) {
-      return CLASS_E_CLASSNOTAVAILABLE;
-    } else {
-      wchar_t path[MAX_PATH];
-      GetFolderPath(path, MAX_PATH, false);
-      LPITEMIDLIST folderList = m_pidlMgr->CreateListFromPath(path);
-      LPITEMIDLIST full = m_pidlMgr->Concatenate(folderList, item);
-      m_pidlMgr->Free(folderList);
-      auto object = com::Make<T>();
-      if (!object || !full) {
-        m_pidlMgr->Free(full);
-        return E_OUTOFMEMORY;
-      }
-      // An object without its list or its item manager would answer for nothing.
-      bool attached = true;
-      if constexpr (std::is_same_v<decltype(attach(*object.Get(), full)), bool>)
-        attached = attach(*object.Get(), full);
-      else
-        attach(*object.Get(), full);
+    wchar_t path[MAX_PATH];
+    GetFolderPath(path, MAX_PATH, false);
+    LPITEMIDLIST folderList = m_pidlMgr->CreateListFromPath(path);
+    LPITEMIDLIST full = m_pidlMgr->Concatenate(folderList, item);
+    m_pidlMgr->Free(folderList);
+    auto object = com::Make<T>();
+    if (!object || !full) {
       m_pidlMgr->Free(full);
-      if (!attached) return E_OUTOFMEMORY;
-      if constexpr (requires { object->IsUsable(); })
-        if (!object->IsUsable()) return E_OUTOFMEMORY;
-      return object->QueryInterface(riid, result);
+      return E_OUTOFMEMORY;
     }
+    // An object without its list or its item manager would answer for nothing.
+    bool attached = true;
+    if constexpr (std::is_same_v<decltype(attach(*object.Get(), full)), bool>)
+      attached = attach(*object.Get(), full);
+    else
+      attach(*object.Get(), full);
+    m_pidlMgr->Free(full);
+    if (!attached) return E_OUTOFMEMORY;
+    if constexpr (requires { object->IsUsable(); })
+      if (!object->IsUsable()) return E_OUTOFMEMORY;
+    return object->QueryInterface(riid, result);
   }
 };

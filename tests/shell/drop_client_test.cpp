@@ -45,24 +45,6 @@ std::wstring StoreText() {
   return text;
 }
 
-bool Pump(const std::function<bool()>& done, DWORD milliseconds = 20000) {
-  for (DWORD start = GetTickCount(); !done();) {
-    if (GetTickCount() - start > milliseconds) return false;
-    MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT);
-    for (MSG msg; PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE);) DispatchMessageW(&msg);
-  }
-  return true;
-}
-
-void Mouse(DWORD flags, POINT at = {}) {
-  INPUT input{};
-  input.type = INPUT_MOUSE;
-  input.mi.dwFlags = flags | MOUSEEVENTF_ABSOLUTE | MOUSEEVENTF_MOVE;
-  input.mi.dx = at.x * 65536 / GetSystemMetrics(SM_CXSCREEN) + 1;
-  input.mi.dy = at.y * 65536 / GetSystemMetrics(SM_CYSCREEN) + 1;
-  SendInput(1, &input, sizeof(input));
-}
-
 // Whether the peer's source was shown the copy effect during the drag.
 bool SawCopy(const std::string& report) {
   size_t at = report.find("effects ");
@@ -127,7 +109,7 @@ class DropOnRootView : public testing::Test {
     ASSERT_EQ(browser_->GetCurrentView(IID_IShellView, view.PutVoid()), S_OK);
     ASSERT_EQ(view->GetWindow(&window), S_OK);
     list_ = GetDlgItem(window, 2000);
-    ASSERT_TRUE(Pump([&] { return ListView_GetItemCount(list_) == 3; })) << "filled";
+    ASSERT_TRUE(PumpUntil([&] { return ListView_GetItemCount(list_) == 3; }, 20000)) << "filled";
     target_ = static_cast<IDropTarget*>(GetPropW(list_, L"OleDropTargetInterface"));
     ASSERT_TRUE(target_) << "the list is a registered target";
   }
@@ -156,7 +138,7 @@ class DropOnRootView : public testing::Test {
   // report and, in `seen`, the selection while the pointer rested on the row.
   std::string DragOnto(int row, const std::wstring& items, std::vector<int>& seen) {
     Peer peer(L"drag 500 20 30 " + items);
-    if (!Pump([&] { return peer.Output().find("ready") != std::string::npos; })) return "peer not ready";
+    if (!PumpUntil([&] { return peer.Output().find("ready") != std::string::npos; }, 20000)) return "peer not ready";
     std::atomic<int> stage{0};
     POINT to = RowPoint(row);
     std::thread hand([&] {
@@ -172,11 +154,11 @@ class DropOnRootView : public testing::Test {
       while (stage == 1) Sleep(10);
       Mouse(MOUSEEVENTF_LEFTUP, to);
     });
-    Pump([&] { return stage == 1; });
-    Pump([] { return false; }, 200);
+    PumpUntil([&] { return stage == 1; }, 20000);
+    PumpUntil([] { return false; }, 200);
     seen = Selected();
     stage = 2;
-    Pump([&] { return WaitForSingleObject(peer.process, 0) == WAIT_OBJECT_0; });
+    PumpUntil([&] { return WaitForSingleObject(peer.process, 0) == WAIT_OBJECT_0; }, 20000);
     hand.join();
     return peer.Output();
   }

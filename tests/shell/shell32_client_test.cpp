@@ -90,17 +90,6 @@ TEST(Shell32Client, ReachesTheFolderUnderMyComputerWalksItAndShowsItsItems) {
   EXPECT_LT(Difference(shown.Get(), own.Get()), 0.1) << "the level's picture";
 }
 
-bool PumpUntil(const std::function<bool()>& done, DWORD milliseconds = 10000) {
-  DWORD start = GetTickCount();
-  while (!done()) {
-    if (GetTickCount() - start > milliseconds) return false;
-    MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT);
-    MSG msg;
-    while (PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE)) DispatchMessageW(&msg);
-  }
-  return true;
-}
-
 // The list of the browser's current view, once its thread has filled it.
 HWND CurrentList(IExplorerBrowser* browser) {
   com::ComPtr<IShellView> view;

@@ -46,3 +46,20 @@ std::wstring Name(IShellFolder* folder, LPCITEMIDLIST item, SHGDNF flags, HRESUL
   if (strret.uType != STRRET_WSTR || !strret.pOleStr) return L"<not a wide string>";
   return win::UniqueCoMem<wchar_t>(strret.pOleStr).Get();
 }
+
+bool PumpUntil(const std::function<bool()>& done, DWORD milliseconds) {
+  for (DWORD start = GetTickCount(); !done();) {
+    if (GetTickCount() - start > milliseconds) return false;
+    MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT);
+    for (MSG msg; PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE);) DispatchMessageW(&msg);
+  }
+  return true;
+}
+
+void Mouse(DWORD flags, POINT at) {
+  INPUT input{INPUT_MOUSE};
+  input.mi.dx = at.x * 65535 / (GetSystemMetrics(SM_CXSCREEN) - 1);
+  input.mi.dy = at.y * 65535 / (GetSystemMetrics(SM_CYSCREEN) - 1);
+  input.mi.dwFlags = flags | MOUSEEVENTF_MOVE | MOUSEEVENTF_ABSOLUTE;
+  SendInput(1, &input, sizeof(input));
+}

@@ -1,6 +1,7 @@
 #pragma once
 #include <windows.h>
 #include <shlobj.h>
+#include <functional>
 #include <string>
 #include <vector>
 #include "helpers/win_handles.h"
@@ -20,3 +21,7 @@ std::vector<UniqueList> Enum(IShellFolder* folder, SHCONTF flags);
 com::ComPtr<IShellFolder> Bind(IShellFolder* parent, LPCITEMIDLIST item);
 // A display name, which must come as a wide string; "<failed>" if the call fails.
 std::wstring Name(IShellFolder* folder, LPCITEMIDLIST item, SHGDNF flags, HRESULT* hr = nullptr);
+// Dispatches this thread's messages until `done` holds or `milliseconds` pass.
+bool PumpUntil(const std::function<bool()>& done, DWORD milliseconds = 10000);
+// Real mouse input at a screen point, as SendInput gives it.
+void Mouse(DWORD flags, POINT at);

@@ -31,18 +31,6 @@
 namespace {
 using Texts = std::vector<std::wstring>;
 
-// Dispatches messages until `done` holds or `seconds` pass.
-bool PumpUntil(const std::function<bool()>& done, double seconds = 10) {
-  auto end = std::chrono::steady_clock::now() + std::chrono::duration<double>(seconds);
-  while (!done()) {
-    if (std::chrono::steady_clock::now() > end) return false;
-    MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT);
-    MSG msg;
-    while (PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE)) DispatchMessageW(&msg);
-  }
-  return true;
-}
-
 int ThreadCount() {
   HANDLE snapshot = CreateToolhelp32Snapshot(TH32CS_SNAPTHREAD, 0);
   THREADENTRY32 entry{sizeof(entry)};
@@ -454,7 +442,7 @@ TEST_F(View, RefreshWhileTheThreadRunsStartsNoSecondThread) {
   for (int i = 0; i < 3; ++i) EXPECT_EQ(Last()->Refresh(), S_OK);
   EXPECT_EQ(Rows(view), Texts{});
   ASSERT_TRUE(PumpUntil([&] { return !AnimationOf(view); }));
-  PumpUntil([] { return false; }, 0.2);
+  PumpUntil([] { return false; }, 200);
   EXPECT_EQ(Rows(view), kRootRows);
 }
 
@@ -966,7 +954,7 @@ TEST_F(View, ContextMenuOnEmptySpaceOffersTheFolderCommandsAndModesGreyedAsNeede
 // calls that come in as messages; ends the process if it takes longer.
 DWORD WaitServing(HANDLE process, double seconds) {
   DWORD code = 99;
-  if (!PumpUntil([&] { return WaitForSingleObject(process, 0) == WAIT_OBJECT_0; }, seconds))
+  if (!PumpUntil([&] { return WaitForSingleObject(process, 0) == WAIT_OBJECT_0; }, static_cast<DWORD>(seconds * 1000)))
     TerminateProcess(process, 99);
   WaitForSingleObject(process, 5000);
   GetExitCodeProcess(process, &code);
@@ -995,7 +983,7 @@ struct Peer {
       root = FindWindowW(L"ViewTestFrame", L"peer root");
       level = FindWindowW(L"ViewTestFrame", L"peer level");
       return root && level && RootRows() == 4;
-    }, 30);
+    }, 30000);
   }
   ~Peer() {
     if (!process) return;
@@ -1025,7 +1013,7 @@ TEST_F(View, DISABLED_Peer) {
   Open(level.Get(), FVM_DETAILS, nullptr, levelBrowser.Get());
   SetWindowTextW(levelBrowser->frame, L"peer level");
   SetWindowTextW(browser_->frame, L"peer root");
-  EXPECT_TRUE(PumpUntil([] { return peerDone; }, 60));
+  EXPECT_TRUE(PumpUntil([] { return peerDone; }, 60000));
   for (auto& view : views_) view->DestroyViewWindow();
   views_.clear();
   RegOverridePredefKey(HKEY_CURRENT_USER, nullptr);
@@ -1063,15 +1051,6 @@ TEST_F(View, AnotherProcessSeesChangesByTheBroadcastAloneAndPastesWhatWasCopiedH
 }
 
 
-// Real input, as the mouse gives it: `flags` at a screen point.
-void Mouse(DWORD flags, POINT at) {
-  INPUT input{INPUT_MOUSE};
-  input.mi.dx = at.x * 65535 / (GetSystemMetrics(SM_CXSCREEN) - 1);
-  input.mi.dy = at.y * 65535 / (GetSystemMetrics(SM_CYSCREEN) - 1);
-  input.mi.dwFlags = flags | MOUSEEVENTF_MOVE | MOUSEEVENTF_ABSOLUTE;
-  SendInput(1, &input, sizeof(input));
-}
-
 // What a surveyor does: presses the mouse on file1.tkf in a level's view, moves to a
 // window of another process that takes virtual files as Explorer does, and lets go.
 // The download runs here, inside the drag; the file lands there.
@@ -1096,7 +1075,7 @@ TEST_F(View, DraggingTheFileToAnotherProcessDownloadsItThere) {
     DWORD owner = 0;
     GetWindowThreadProcessId(WindowFromPoint(to), &owner);
     return owner == GetProcessId(receiver);
-  }, 20)) << "the receiver's window is up";
+  }, 20000)) << "the receiver's window is up";
   ClientToScreen(ListOf(view), &from);
   DialogDriver driver(IDC_TRANSFER_START, {}, 60000);
   std::thread hand([&] {

@@ -11,13 +11,8 @@
 #include <sddl.h>  // after <windows.h>
 
 namespace {
-using List = win::UniqueCoMem<ITEMIDLIST>;
-using Ids = std::vector<std::pair<int, std::wstring>>;
-const USHORT kTerminator = 0;
-const LPCITEMIDLIST kEmpty = reinterpret_cast<LPCITEMIDLIST>(&kTerminator);
 const HKEY kUser = HKEY_CURRENT_USER;
 const std::wstring kBase = L"Software\\Gravon\\Shell Extensions\\Marlix DL View", kLevels = kBase + L"\\Levels";
-const BYTE* Raw(LPCITEMIDLIST list) { return reinterpret_cast<const BYTE*>(list); }
 std::wstring LevelPath(int n) { return kLevels + L"\\Station " + std::to_wstring(n); }
 std::wstring NameAt(int n) { return RegReadString(kUser, LevelPath(n), L"Name"); }
 CStationRecord Named(const std::wstring& name) { CStationRecord r; r.Name = name; return r; }
@@ -43,109 +38,8 @@ std::pair<DWORD, DWORD> TypeAndSize(const std::wstring& path, const wchar_t* val
   return {type, size};
 }
 struct Store : ::testing::Test {
-  Ids IdsOf(LPCITEMIDLIST list) {
-    Ids ids;
-    for (UINT i = 0; i < m.GetCount(list); ++i) {
-      List one(m.CopyFrom(list, i));
-      ids.emplace_back(CPidlMgr::GetType(one.Get()), CPidlMgr::GetTextCopy(one.Get()));
-    }
-    return ids;
-  }
   RegistrySandbox sandbox;
-  CPidlMgr m;
 };
-TEST_F(Store, IdBytesAndListsFromPaths) {
-  using V = std::vector<std::wstring>;
-  for (const auto& [path, parts] : {std::pair<const wchar_t*, V>{nullptr, {}}, {L"\\/\\\\//", {}},
-                                    {L"R//A\\\\B/", {L"R", L"A", L"B"}},
-                                    {L"\\R\\A b\\B\\C", {L"R", L"A b", L"B", L"C"}}})
-    EXPECT_EQ(PathComponents(path), parts) << path;
-  for (auto [at, part] : {std::pair{1, L"A"}, {3, L""}}) EXPECT_EQ(PathComponent(L"/R/A/B", at), part) << at;
-  List file(m.CreateItem(PIDL_FILE, L"file1.tkf", 20));
-  ASSERT_TRUE(file);
-  const BYTE* b = Raw(file.Get());
-  EXPECT_EQ(std::make_tuple(b[0] | (b[1] << 8), b[2] | (b[3] << 8) | (b[4] << 16) | (b[5] << 24), b[39] | b[40]),
-            std::make_tuple(39, 3, 0)) << "size, type, terminator";
-  EXPECT_EQ(std::memcmp(b + 14, L"file1.tkf", 20), 0);
-  EXPECT_EQ(m.GetSize(file.Get()), 41u);
-  EXPECT_EQ(IdSize(List(m.CreateItem(PIDL_LEVEL, L"ab", 0x10006)).Get()), 25) << "the low 16 bits of the size";
-  EXPECT_EQ(IdsOf(List(m.CreateRoot()).Get()), (Ids{{1, L"Marlix Digital Levels"}}));
-  for (const wchar_t* path : {L"", L"\\//"})
-    EXPECT_TRUE(!m.CreateItemFromPath(path) && !m.CreateListFromPath(path)) << path;
-  for (const auto& [path, item, list] : {std::tuple<const wchar_t*, Ids, Ids>{L"R", {{1, L"R"}}, {{1, L"R"}}},
-                                         {L"\\R\\A", {{2, L"A"}}, {{1, L"R"}, {2, L"A"}}},
-                                         {L"R/A/B", {{2, L"A"}}, {{1, L"R"}, {2, L"A"}, {3, L"B"}}},
-                                         {L"R\\A\\B\\C", {{2, L"A"}}, {{1, L"R"}, {2, L"A"}, {3, L"B"}}}}) {
-    EXPECT_EQ(IdsOf(List(m.CreateItemFromPath(path)).Get()), item) << path;
-    EXPECT_EQ(IdsOf(List(m.CreateListFromPath(path)).Get()), list) << path;
-  }
-}
-TEST_F(Store, ListOperationsKindsAndCompare) {
-  List full(m.CreateListFromPath(L"R\\Level\\file1.tkf")), root(m.CreateRoot());
-  EXPECT_EQ(m.GetSize(nullptr) + m.GetCount(nullptr) + m.GetCount(kEmpty), 0u);
-  EXPECT_EQ(std::make_pair(m.GetSize(kEmpty), m.GetCount(full.Get())), std::make_pair(2u, 3u));
-  EXPECT_EQ(CPidlMgr::GetTextCopy(m.GetLast(full.Get())), L"file1.tkf");
-  EXPECT_EQ(Raw(m.GetNext(full.Get())), Raw(full.Get()) + 19 + 4);
-  for (int row = 0; LPCITEMIDLIST none : std::initializer_list<LPCITEMIDLIST>{
-           m.GetLast(kEmpty), m.Concatenate(nullptr, nullptr), m.CopyFrom(full.Get(), 3), m.CopyFrom(kEmpty, 0),
-           m.CopyParent(root.Get())})
-    EXPECT_EQ(none, nullptr) << "row " << row++;
-  for (LPITEMIDLIST made : {m.Concatenate(nullptr, full.Get()), m.Concatenate(full.Get(), nullptr)}) {
-    List copy(made);
-    ASSERT_TRUE(copy && copy.Get() != full.Get()) << "a fresh copy";
-    EXPECT_EQ(std::memcmp(copy.Get(), full.Get(), m.GetSize(full.Get())), 0);
-  }
-  List tail(m.CopyFrom(full.Get(), 1)), parent(m.CopyParent(full.Get()));
-  EXPECT_EQ(IdsOf(tail.Get()), (Ids{{2, L"Level"}, {3, L"file1.tkf"}}));
-  EXPECT_EQ(IdsOf(parent.Get()), (Ids{{1, L"R"}, {2, L"Level"}}));
-  List joined(m.Concatenate(parent.Get(), tail.Get()));
-  EXPECT_EQ(std::make_pair(m.GetSize(joined.Get()), m.GetCount(joined.Get())),
-            std::make_pair(m.GetSize(parent.Get()) + m.GetSize(tail.Get()) - 2, 4u));
-  List level(m.CreateListFromPath(L"R\\L"));
-  using Kind = std::tuple<LPCITEMIDLIST, bool, bool, bool>;  // the kind of a list is that of its last id
-  for (int row = 0; auto [list, top, folder, leaf] :
-       {Kind{root.Get(), true, true, false}, Kind{level.Get(), false, true, false},
-        Kind{full.Get(), false, false, true}, Kind{kEmpty, false, false, false}, Kind{nullptr, false, false, false}})
-    EXPECT_EQ(std::make_tuple(m.IsRoot(list), m.IsTopLevel(list), m.IsFolder(list), m.IsFile(list)),
-              std::make_tuple(top, top, folder, leaf)) << "row " << row++;
-  List a(m.CreateItemFromPath(L"R\\alpha")), upper(m.CreateItemFromPath(L"R\\ALPHA")),
-      b(m.CreateItemFromPath(L"R\\beta")), file(m.CreateItem(PIDL_FILE, L"aaa", 8));
-  for (LPCITEMIDLIST same : {upper.Get(), file.Get()}) EXPECT_EQ(m.Compare(0, a.Get(), same), 0);
-  EXPECT_EQ(m.Compare(0, nullptr, a.Get()), 0);
-  int raw = m.Compare(0, a.Get(), b.Get());
-  EXPECT_LT(raw, 0);
-  EXPECT_EQ(m.Compare(-1, a.Get(), b.Get()), -raw) << "compare ignores case and never orders by type";
-  EXPECT_EQ(m.Compare(3, a.Get(), b.Get()), 3 * raw);
-}
-TEST_F(Store, PathsParsingNameAndValidity) {
-  List one(m.CreateItem(PIDL_LEVEL, L"abc", 8));
-  wchar_t buffer[MAX_PATH];
-  EXPECT_EQ(m.GetPath(one.Get(), buffer, MAX_PATH), 3u);
-  EXPECT_STREQ(buffer, L"abc");
-  EXPECT_EQ(m.GetPath(one.Get(), nullptr, 0), 5u);
-  List full(m.CreateListFromPath(L"/Marlix Digital Levels/L1/file1.tkf"));
-  UINT needed = m.GetPath(full.Get(), nullptr, 0);
-  EXPECT_EQ(needed, 21u + 1 + 2 + 1 + 9 + 1 + 1);
-  std::vector<wchar_t> exact(needed);
-  EXPECT_EQ(m.GetPath(full.Get(), exact.data(), needed), needed - 2);
-  EXPECT_STREQ(exact.data(), L"Marlix Digital Levels\\L1\\file1.tkf");
-  std::vector<wchar_t> small(8, 0x5555);
-  EXPECT_EQ(m.GetPath(full.Get(), small.data(), 6), 5u);
-  EXPECT_STREQ(small.data(), L"Marli") << "a destination too small gets a cut, terminated text";
-  EXPECT_EQ(small[6], wchar_t(0x5555)) << "and nothing past its length";
-  List longPath(m.CreateListFromPath((L"R\\" + std::wstring(259, L'n') + L"\\file1.tkf").c_str()));
-  EXPECT_EQ(m.GetPath(longPath.Get(), buffer, MAX_PATH), UINT(MAX_PATH - 1));
-  EXPECT_EQ(m.GetRootParsingName(nullptr, 0), 41u);
-  EXPECT_EQ(m.GetRootParsingName(buffer, 64), 41u);
-  EXPECT_STREQ(buffer, L"::{D8B818CA-E47C-49a1-96A5-C2AA5FB57F15}");
-  EXPECT_EQ(m.GetRootParsingName(buffer, 3), 3u);
-  List level(m.CreateItemFromPath(L"R\\Mine")), other(m.CreateItemFromPath(L"R\\mine")), root(m.CreateRoot());
-  EXPECT_FALSE(m.IsValid(level.Get())) << "validity asks the store";
-  EXPECT_TRUE(m.IsValid(root.Get()) && m.IsValid(nullptr)) << "the root and no list are always valid";
-  ASSERT_EQ(Add(L"Mine"), S_OK);
-  EXPECT_TRUE(m.IsValid(level.Get()));
-  EXPECT_FALSE(m.IsValid(other.Get()));
-}
 TEST_F(Store, DefaultsAndAStoreThatCannotBeReached) {
   EXPECT_TRUE(Fields(CStationRecord()) ==
               std::make_tuple(std::wstring(), 1, 9600, 1, 0, 8, 0, 1, std::wstring(), std::wstring(L"HRA20")));
@@ -305,26 +199,6 @@ std::vector<CStationRecord> Unpacked(const std::vector<BYTE>& bytes) {
   std::vector<CStationRecord> out;
   EXPECT_EQ(UnpackStations(h.Get(), out), S_OK);
   return out;
-}
-TEST(PackedStations, RoundTripKeepsEveryFieldAndTheLayout) {
-  const std::vector<CStationRecord> records = {Full(L"first", 1), Full(L"", 50), Full(L"third level", -9)};
-  win::UniqueHGlobal h(PackStations(records));
-  ASSERT_TRUE(h);
-  EXPECT_EQ(GlobalFlags(h.Get()) & GMEM_DDESHARE, UINT(GMEM_DDESHARE));
-  std::vector<BYTE> bytes = Bytes(h.Get());
-  EXPECT_GE(bytes.size(), 4u + 3 * (4 + 28) + (6 + 11 + 6 + 1 + 6 + 6 + 12 + 17 + 6) * 2);
-  EXPECT_EQ(bytes[0], 3);
-  EXPECT_EQ(bytes[4], (6 + 11 + 6) * 2 + 28);  // size of the first packed record
-  EXPECT_EQ(bytes[8 + 12], 2);                  // its Port, right behind the name's terminator
-  std::vector<CStationRecord> out = {Named(L"kept")};
-  ASSERT_EQ(UnpackStations(h.Get(), out), S_OK);
-  ASSERT_EQ(out.size(), 4u);
-  EXPECT_EQ(out[0].Name, L"kept");
-  for (size_t i = 0; i < records.size(); ++i) EXPECT_TRUE(Fields(out[i + 1]) == Fields(records[i])) << i;
-  win::UniqueHGlobal empty(PackStations({}));
-  EXPECT_TRUE(Unpacked(Bytes(empty.Get())).empty());
-  EXPECT_EQ(UnpackStations(nullptr, out), S_OK);
-  EXPECT_EQ(out.size(), 4u);
 }
 TEST(PackedStations, DamagedBlocksYieldOnlyTheWholeRecordsBefore) {
   const std::vector<CStationRecord> records = {Full(L"one", 1), Full(L"two", 2)};

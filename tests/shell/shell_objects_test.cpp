@@ -122,9 +122,6 @@ TEST_F(ShellFolder, PositionsAddressesAndInterfaces) {
   EXPECT_EQ(level_->QueryInterface(IID_IShellFolder2, other.PutVoid()), E_NOINTERFACE);
   EXPECT_EQ(level_->BindToObject(file_.Get(), nullptr, IID_IShellFolder, other.PutVoid()), E_INVALIDARG);
   EXPECT_EQ(root_->BindToObject(alpha_.Get(), nullptr, IID_IDropTarget, other.PutVoid()), E_NOINTERFACE);
-  EXPECT_EQ(root_->BindToStorage(alpha_.Get(), nullptr, IID_IStream, other.PutVoid()), E_NOTIMPL);
-  EXPECT_EQ(root_->SetNameOf(nullptr, alpha_.Get(), L"x", 0, nullptr), E_NOTIMPL);
-  EXPECT_EQ(CreateMarlixDLShellFolder(IID_IShellFolder, other.PutVoid()), S_OK);
 }
 
 TEST_F(ShellFolder, EnumeratesThroughItsOwnPathAndValidatesOnlyTheFirstItemsAttributes) {

@@ -277,8 +277,6 @@ TEST_F(View, RootShowsTheAddRowFirstThenTheLevelsInOrderFromAThreadBehindTheClip
   ASSERT_TRUE(view);
   HWND clip = AnimationOf(view);
   ASSERT_TRUE(clip) << "the clip plays while the thread runs";
-  EXPECT_EQ(GetDlgCtrlID(clip), 1300);
-  EXPECT_EQ(static_cast<DWORD>(GetWindowLongW(clip, GWL_STYLE)) & ~WS_DISABLED, 0x50000007u);
   // Wine's control can't say whether it plays: open the module's clip in one of our own.
   HWND probe = CreateWindowExW(0, ANIMATE_CLASSW, nullptr, WS_CHILD, 0, 0, 80, 50, view, nullptr, nullptr, nullptr);
   EXPECT_TRUE(SendMessageW(probe, ACM_OPENW, reinterpret_cast<WPARAM>(GetModuleHandleW(nullptr)),
@@ -841,16 +839,6 @@ TEST_F(View, DeleteAndPasteInALevelsViewChangeNothingYetEveryViewOfALevelReloads
   EXPECT_TRUE(PumpUntil([&] { return frameCommands.size() >= 5; })) << "delete: itself, and both by its broadcast; paste: both by its broadcast";
   Refilled(second);
   EXPECT_EQ(Rows(root), kRootRows) << "the root view hears only changes of the root";
-}
-
-TEST_F(View, ADeletedLevelDisappearsFromEveryViewOfTheRoot) {
-  HWND view = Open(root_.Get());
-  HWND other = Open(root_.Get());
-  Select(view, 2);
-  Command(view, kCmdDelete);
-  const Texts left = {L"Add New Digital Level", L"alpha", L"Charlie"};
-  EXPECT_TRUE(PumpUntil([&] { return Rows(other) == left; })) << "by the broadcast alone";
-  EXPECT_TRUE(PumpUntil([&] { return Rows(view) == left; }));
 }
 
 TEST_F(View, CommandTargetAnnouncesThreeCommandsInFourGroupsAndExecRunsAnyGroup) {

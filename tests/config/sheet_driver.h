@@ -12,31 +12,13 @@
 
 #include "config/station_dialog.h"
 #include "support/registry_sandbox.h"
+#include "support/window_waits.h"
 
 namespace sheet {
 
-// Every wait gives up after 10 s, so a failing test cannot hang.
-template <class Condition>
-bool WaitFor(Condition condition) {
-  for (ULONGLONG end = GetTickCount64() + 10000; !condition(); Sleep(20))
-    if (GetTickCount64() > end) return false;
-  return true;
-}
-
-inline std::wstring Text(HWND window, int id = -1) {  // of control `id`, or of the window itself
-  wchar_t text[1024] = {};
-  GetWindowTextW(id < 0 ? window : GetDlgItem(window, id), text, 1024);
-  return text;
-}
-
-inline HWND OwnedDialog(HWND owner) {  // a visible dialog window or message box of this process
-  DWORD process = 0;
-  for (HWND found = nullptr; (found = FindWindowExW(nullptr, found, L"#32770", nullptr)) != nullptr;)
-    if (GetWindow(found, GW_OWNER) == owner && IsWindowVisible(found) && GetWindowThreadProcessId(found, &process) &&
-        process == GetCurrentProcessId())
-      return found;
-  return nullptr;
-}
+using ui::OwnedDialog;
+using ui::Text;
+using ui::WaitFor;
 
 // The page window at `index`, null while the page was never shown.
 inline HWND Page(HWND sheet, int index) {

@@ -12,18 +12,15 @@
 #include "helpers/error_reporter.h"
 #include "base/resource_ids.h"
 #include "store/string_table.h"
+#include "support/window_waits.h"
 #include "transfer/download_dialog.h"
 
 namespace {
 namespace fs = std::filesystem;
 
-// Every wait gives up after 10 s, so a failing test cannot hang.
-template <class Condition>
-bool WaitFor(Condition condition) {
-  for (ULONGLONG end = GetTickCount64() + 10000; !condition(); Sleep(20))
-    if (GetTickCount64() > end) return false;
-  return true;
-}
+using ui::OwnedDialog;
+using ui::Text;
+using ui::WaitFor;
 
 fs::path Self() {
   wchar_t self[MAX_PATH] = {};
@@ -51,24 +48,10 @@ void LogFree(const PointsBlock* block) {
   std::ofstream(Beside(L"MarlixComm.log"), std::ios::app | std::ios::binary) << "FreePoints preset=" << intact << "\r\n";
 }
 
-std::wstring Text(HWND window, int id = -1) {  // of control `id`, or of the window itself
-  wchar_t text[2048] = {};
-  GetWindowTextW(id < 0 ? window : GetDlgItem(window, id), text, 2048);
-  return text;
-}
 void Click(HWND dialog, int id) { PostMessageW(GetDlgItem(dialog, id), BM_CLICK, 0, 0); }
 bool Start(HWND dialog) {  // true once the transfer runs
   Click(dialog, IDC_TRANSFER_START);
   return WaitFor([&] { return Text(dialog, IDC_TRANSFER_STATUS) == L"Waiting for download..."; });
-}
-
-HWND OwnedDialog(HWND owner) {  // a visible dialog window or message box of this process
-  DWORD process = 0;
-  for (HWND found = nullptr; (found = FindWindowExW(nullptr, found, L"#32770", nullptr)) != nullptr;)
-    if (GetWindow(found, GW_OWNER) == owner && IsWindowVisible(found) && GetWindowThreadProcessId(found, &process) &&
-        process == GetCurrentProcessId())
-      return found;
-  return nullptr;
 }
 
 // Waits for the message box that `dialog` owns, checks its caption, dismisses it and returns its text.

@@ -11,6 +11,7 @@
 #include <sddl.h>  // after <windows.h>
 
 namespace {
+using List = win::UniqueCoMem<ITEMIDLIST>;
 const HKEY kUser = HKEY_CURRENT_USER;
 const std::wstring kBase = L"Software\\Gravon\\Shell Extensions\\Marlix DL View", kLevels = kBase + L"\\Levels";
 std::wstring LevelPath(int n) { return kLevels + L"\\Station " + std::to_wstring(n); }
@@ -39,7 +40,37 @@ std::pair<DWORD, DWORD> TypeAndSize(const std::wstring& path, const wchar_t* val
 }
 struct Store : ::testing::Test {
   RegistrySandbox sandbox;
+  CPidlMgr m;
 };
+TEST_F(Store, PathsParsingNameAndValidity) {
+  List one(m.CreateItem(PIDL_LEVEL, L"abc", 8));
+  wchar_t buffer[MAX_PATH];
+  EXPECT_EQ(m.GetPath(one.Get(), buffer, MAX_PATH), 3u);
+  EXPECT_STREQ(buffer, L"abc");
+  EXPECT_EQ(m.GetPath(one.Get(), nullptr, 0), 5u);
+  List full(m.CreateListFromPath(L"/Marlix Digital Levels/L1/file1.tkf"));
+  UINT needed = m.GetPath(full.Get(), nullptr, 0);
+  EXPECT_EQ(needed, 21u + 1 + 2 + 1 + 9 + 1 + 1);
+  std::vector<wchar_t> exact(needed);
+  EXPECT_EQ(m.GetPath(full.Get(), exact.data(), needed), needed - 2);
+  EXPECT_STREQ(exact.data(), L"Marlix Digital Levels\\L1\\file1.tkf");
+  std::vector<wchar_t> small(8, 0x5555);
+  EXPECT_EQ(m.GetPath(full.Get(), small.data(), 6), 5u);
+  EXPECT_STREQ(small.data(), L"Marli") << "a destination too small gets a cut, terminated text";
+  EXPECT_EQ(small[6], wchar_t(0x5555)) << "and nothing past its length";
+  List longPath(m.CreateListFromPath((L"R\\" + std::wstring(259, L'n') + L"\\file1.tkf").c_str()));
+  EXPECT_EQ(m.GetPath(longPath.Get(), buffer, MAX_PATH), UINT(MAX_PATH - 1));
+  EXPECT_EQ(m.GetRootParsingName(nullptr, 0), 41u);
+  EXPECT_EQ(m.GetRootParsingName(buffer, 64), 41u);
+  EXPECT_STREQ(buffer, L"::{D8B818CA-E47C-49a1-96A5-C2AA5FB57F15}");
+  EXPECT_EQ(m.GetRootParsingName(buffer, 3), 3u);
+  List level(m.CreateItemFromPath(L"R\\Mine")), other(m.CreateItemFromPath(L"R\\mine")), root(m.CreateRoot());
+  EXPECT_FALSE(m.IsValid(level.Get())) << "validity asks the store";
+  EXPECT_TRUE(m.IsValid(root.Get()) && m.IsValid(nullptr)) << "the root and no list are always valid";
+  ASSERT_EQ(Add(L"Mine"), S_OK);
+  EXPECT_TRUE(m.IsValid(level.Get()));
+  EXPECT_FALSE(m.IsValid(other.Get()));
+}
 TEST_F(Store, DefaultsAndAStoreThatCannotBeReached) {
   EXPECT_TRUE(Fields(CStationRecord()) ==
               std::make_tuple(std::wstring(), 1, 9600, 1, 0, 8, 0, 1, std::wstring(), std::wstring(L"HRA20")));

@@ -14,7 +14,7 @@
 #include <string>
 #include <vector>
 
-#include "bench/bench_browser.h"
+#include "bench/bench_support.h"
 #include "shell/shell_folder.h"
 #include "shell/shell_view.h"
 #include "store/station_record.h"
@@ -102,11 +102,8 @@ void ClipLevels(int count) {
 
 int main() {
   OleInitialize(nullptr);
-  const std::wstring scratchPath = L"Software\\MarlixBenchCommands" + std::to_wstring(GetCurrentProcessId());
-  HKEY scratch = nullptr;
-  if (RegCreateKeyExW(HKEY_CURRENT_USER, scratchPath.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &scratch,
-                      nullptr) != ERROR_SUCCESS ||
-      RegOverridePredefKey(HKEY_CURRENT_USER, scratch) != ERROR_SUCCESS) {
+  bench::ScratchStore store(L"MarlixBenchCommands");
+  if (!store.Ready()) {
     std::fprintf(stderr, "no scratch key\n");
     return 1;
   }
@@ -181,9 +178,6 @@ int main() {
     CloseClipboard();
     DestroyWindow(frame);
   }
-  RegOverridePredefKey(HKEY_CURRENT_USER, nullptr);
-  RegCloseKey(scratch);
-  RegDeleteTreeW(HKEY_CURRENT_USER, scratchPath.c_str());
   OleUninitialize();
   return 0;
 }

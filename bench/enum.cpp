@@ -10,6 +10,7 @@
 #include <string>
 #include <vector>
 
+#include "bench/bench_support.h"
 #include "shell/shell_folder.h"
 #include "store/station_record.h"
 
@@ -46,25 +47,6 @@ size_t FolderWalk(IShellFolder* folder) {
   return count;
 }
 
-size_t BareWalk() {
-  HKEY levels = nullptr;
-  if (RegOpenKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, KEY_READ, &levels) != ERROR_SUCCESS) return 0;
-  size_t count = 0;
-  for (DWORD index = 0;; ++index) {
-    wchar_t key[MAX_PATH];
-    DWORD length = MAX_PATH;
-    if (RegEnumKeyExW(levels, index, key, &length, nullptr, nullptr, nullptr, nullptr) != ERROR_SUCCESS) break;
-    HKEY level = nullptr;
-    if (RegOpenKeyExW(levels, key, 0, KEY_READ, &level) != ERROR_SUCCESS) continue;
-    wchar_t name[MAX_PATH + 1];
-    DWORD size = MAX_PATH * sizeof(wchar_t);
-    if (RegQueryValueExW(level, L"Name", nullptr, nullptr, reinterpret_cast<BYTE*>(name), &size) == ERROR_SUCCESS)
-      ++count;
-    RegCloseKey(level);
-  }
-  RegCloseKey(levels);
-  return count;
-}
 
 template <class F>
 double Seconds(F&& run) {
@@ -79,7 +61,7 @@ void Measure(IShellFolder* folder, int levels, int rounds) {
   size_t seenOurs = 0, seenBare = 0;
   for (int i = 0; i < rounds; ++i) {
     ours.push_back(Seconds([&] { seenOurs = FolderWalk(folder); }));
-    bare.push_back(Seconds([&] { seenBare = BareWalk(); }));
+    bare.push_back(Seconds([&] { seenBare = bench::BareWalk(); }));
   }
   std::sort(ours.begin(), ours.end());
   std::sort(bare.begin(), bare.end());
@@ -92,11 +74,8 @@ void Measure(IShellFolder* folder, int levels, int rounds) {
 
 int main() {
   CoInitialize(nullptr);
-  const std::wstring scratchPath = L"Software\\MarlixBenchEnum" + std::to_wstring(GetCurrentProcessId());
-  HKEY scratch = nullptr;
-  if (RegCreateKeyExW(HKEY_CURRENT_USER, scratchPath.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &scratch,
-                      nullptr) != ERROR_SUCCESS ||
-      RegOverridePredefKey(HKEY_CURRENT_USER, scratch) != ERROR_SUCCESS) {
+  bench::ScratchStore store(L"MarlixBenchEnum");
+  if (!store.Ready()) {
     std::fprintf(stderr, "no scratch key\n");
     return 1;
   }
@@ -108,9 +87,6 @@ int main() {
       Measure(folder.Get(), levels, rounds);
     }
   }
-  RegOverridePredefKey(HKEY_CURRENT_USER, nullptr);
-  RegCloseKey(scratch);
-  RegDeleteTreeW(HKEY_CURRENT_USER, scratchPath.c_str());
   CoUninitialize();
   return 0;
 }

@@ -12,7 +12,7 @@
 #include <string>
 #include <vector>
 
-#include "bench/bench_browser.h"
+#include "bench/bench_support.h"
 #include "shell/shell_folder.h"
 #include "shell/shell_view.h"
 #include "store/station_record.h"
@@ -38,25 +38,6 @@ void Seed(int count) {
   RegCloseKey(levels);
 }
 
-size_t BareWalk() {
-  HKEY levels = nullptr;
-  if (RegOpenKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, KEY_READ, &levels) != ERROR_SUCCESS) return 0;
-  size_t count = 0;
-  for (DWORD index = 0;; ++index) {
-    wchar_t key[MAX_PATH];
-    DWORD length = MAX_PATH;
-    if (RegEnumKeyExW(levels, index, key, &length, nullptr, nullptr, nullptr, nullptr) != ERROR_SUCCESS) break;
-    HKEY level = nullptr;
-    if (RegOpenKeyExW(levels, key, 0, KEY_READ, &level) != ERROR_SUCCESS) continue;
-    wchar_t name[MAX_PATH + 1];
-    DWORD size = MAX_PATH * sizeof(wchar_t);
-    if (RegQueryValueExW(level, L"Name", nullptr, nullptr, reinterpret_cast<BYTE*>(name), &size) == ERROR_SUCCESS)
-      ++count;
-    RegCloseKey(level);
-  }
-  RegCloseKey(levels);
-  return count;
-}
 
 double Since(Clock::time_point start) { return std::chrono::duration<double>(Clock::now() - start).count(); }
 
@@ -94,7 +75,7 @@ Times Measure(IShellFolder* folder, IShellBrowser* browser, int rounds) {
     view->DestroyViewWindow();
     view.Reset();
     start = Clock::now();
-    BareWalk();
+    bench::BareWalk();
     bare.push_back(Since(start));
   }
   return {Median(create), Median(filled), Median(bare), rows};
@@ -104,11 +85,8 @@ Times Measure(IShellFolder* folder, IShellBrowser* browser, int rounds) {
 
 int main() {
   OleInitialize(nullptr);
-  const std::wstring scratchPath = L"Software\\MarlixBenchView" + std::to_wstring(GetCurrentProcessId());
-  HKEY scratch = nullptr;
-  if (RegCreateKeyExW(HKEY_CURRENT_USER, scratchPath.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &scratch,
-                      nullptr) != ERROR_SUCCESS ||
-      RegOverridePredefKey(HKEY_CURRENT_USER, scratch) != ERROR_SUCCESS) {
+  bench::ScratchStore store(L"MarlixBenchView");
+  if (!store.Ready()) {
     std::fprintf(stderr, "no scratch key\n");
     return 1;
   }
@@ -129,9 +107,6 @@ int main() {
     std::printf("CreateViewWindow 10,000/10 levels: ratio %.2f\n", large.create / small.create);
     DestroyWindow(frame);
   }
-  RegOverridePredefKey(HKEY_CURRENT_USER, nullptr);
-  RegCloseKey(scratch);
-  RegDeleteTreeW(HKEY_CURRENT_USER, scratchPath.c_str());
   OleUninitialize();
   return 0;
 }

@@ -90,17 +90,7 @@ STDMETHODIMP CMarlixDLShellView::CreateViewWindow(IShellView* previous, LPCFOLDE
   if (!browser || !settings || !rect || !IsUsable()) return E_INVALIDARG;
   if (IsWindow(ViewWindow)) return E_UNEXPECTED;  // one window per view object
   HINSTANCE module = ModuleInstance();
-  WNDCLASSW existing{};
-  if (!GetClassInfoW(module, kViewWindowClass, &existing)) {
-    WNDCLASSW wc{};
-    wc.style = CS_HREDRAW | CS_VREDRAW;
-    wc.lpfnWndProc = ViewWindowProc;
-    wc.hInstance = module;
-    wc.hCursor = LoadCursorW(nullptr, IDC_ARROW);
-    wc.hbrBackground = reinterpret_cast<HBRUSH>(COLOR_WINDOW + 1);
-    wc.lpszClassName = kViewWindowClass;
-    if (!RegisterClassW(&wc)) return E_FAIL;
-  }
+  if (!RegisterModuleClass(kViewWindowClass, ViewWindowProc)) return E_FAIL;
 
   ShellBrowser = com::ComPtr<IShellBrowser>(browser);
   CommDlgBrowser.Reset();

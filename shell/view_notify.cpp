@@ -27,18 +27,7 @@ LRESULT CALLBACK NotifyWindowProc(HWND window, UINT message, WPARAM wParam, LPAR
 HRESULT CreateNotifyWindow(NotifyWindowPair& pair, HWND viewWindow) {
   pair.ViewWindow = viewWindow;
   HINSTANCE module = ModuleInstance();
-  WNDCLASSW existing{};
-  if (!GetClassInfoW(module, kNotifyWindowClass, &existing)) {
-    WNDCLASSW wc{};
-    wc.style = CS_HREDRAW | CS_VREDRAW;
-    wc.lpfnWndProc = NotifyWindowProc;
-    wc.hInstance = module;
-    wc.hCursor = LoadCursorW(nullptr, IDC_ARROW);
-    wc.hbrBackground = reinterpret_cast<HBRUSH>(COLOR_WINDOW + 1);
-    wc.lpszClassName = kNotifyWindowClass;
-    // Another thread may have registered it meanwhile; that is as good.
-    if (!RegisterClassW(&wc) && GetLastError() != ERROR_CLASS_ALREADY_EXISTS) return E_FAIL;
-  }
+  if (!RegisterModuleClass(kNotifyWindowClass, NotifyWindowProc)) return E_FAIL;
   HWND hidden = CreateWindowExW(0, kNotifyWindowClass, nullptr, 0, 0, 0, 0, 0, nullptr, nullptr,
                                 module, &pair);
   if (!hidden) return E_FAIL;

@@ -1,0 +1,84 @@
+// What the benchmarks share: a scratch store, the bare registry walk they are measured
+// against, and the browser the view benchmarks host their views in.
+#pragma once
+#include <windows.h>
+#include <shlobj.h>
+
+#include <string>
+
+#include "server/com_base.h"
+#include "store/station_record.h"
+
+namespace bench {
+
+// A scratch copy of HKEY_CURRENT_USER for the life of the object, removed afterwards.
+class ScratchStore {
+ public:
+  explicit ScratchStore(const wchar_t* name)
+      : path_(std::wstring(L"Software\\") + name + std::to_wstring(GetCurrentProcessId())) {
+    if (RegCreateKeyExW(HKEY_CURRENT_USER, path_.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &key_, nullptr) ==
+        ERROR_SUCCESS)
+      ready_ = RegOverridePredefKey(HKEY_CURRENT_USER, key_) == ERROR_SUCCESS;
+  }
+  ~ScratchStore() {
+    RegOverridePredefKey(HKEY_CURRENT_USER, nullptr);
+    if (key_) RegCloseKey(key_);
+    RegDeleteTreeW(HKEY_CURRENT_USER, path_.c_str());
+  }
+  bool Ready() const { return ready_; }
+
+ private:
+  std::wstring path_;
+  HKEY key_ = nullptr;
+  bool ready_ = false;
+};
+
+// The levels' names read straight from the registry: what enumeration costs at the least.
+inline size_t BareWalk() {
+  HKEY levels = nullptr;
+  if (RegOpenKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, KEY_READ, &levels) != ERROR_SUCCESS) return 0;
+  size_t count = 0;
+  for (DWORD index = 0;; ++index) {
+    wchar_t key[MAX_PATH];
+    DWORD length = MAX_PATH;
+    if (RegEnumKeyExW(levels, index, key, &length, nullptr, nullptr, nullptr, nullptr) != ERROR_SUCCESS) break;
+    HKEY level = nullptr;
+    if (RegOpenKeyExW(levels, key, 0, KEY_READ, &level) != ERROR_SUCCESS) continue;
+    wchar_t name[MAX_PATH + 1];
+    DWORD size = MAX_PATH * sizeof(wchar_t);
+    if (RegQueryValueExW(level, L"Name", nullptr, nullptr, reinterpret_cast<BYTE*>(name), &size) == ERROR_SUCCESS)
+      ++count;
+    RegCloseKey(level);
+  }
+  RegCloseKey(levels);
+  return count;
+}
+
+
+// The least a browser must do for a view: give it a window.
+class Browser : public com::ComObject<IShellBrowser> {
+ public:
+  explicit Browser(HWND frame) : frame_(frame) {}
+  STDMETHODIMP GetWindow(HWND* window) override { *window = frame_; return S_OK; }
+  STDMETHODIMP ContextSensitiveHelp(BOOL) override { return E_NOTIMPL; }
+  STDMETHODIMP InsertMenusSB(HMENU, LPOLEMENUGROUPWIDTHS) override { return S_OK; }
+  STDMETHODIMP SetMenuSB(HMENU, HOLEMENU, HWND) override { return S_OK; }
+  STDMETHODIMP RemoveMenusSB(HMENU) override { return S_OK; }
+  STDMETHODIMP SetStatusTextSB(LPCWSTR) override { return S_OK; }
+  STDMETHODIMP EnableModelessSB(BOOL) override { return S_OK; }
+  STDMETHODIMP TranslateAcceleratorSB(MSG*, WORD) override { return S_FALSE; }
+  STDMETHODIMP BrowseObject(PCUIDLIST_RELATIVE, UINT) override { return E_NOTIMPL; }
+  STDMETHODIMP GetViewStateStream(DWORD, IStream** stream) override { *stream = nullptr; return E_NOTIMPL; }
+  STDMETHODIMP GetControlWindow(UINT, HWND* window) override { *window = nullptr; return E_NOTIMPL; }
+  STDMETHODIMP SendControlMsg(UINT, UINT, WPARAM, LPARAM, LRESULT* result) override {
+    if (result) *result = 0;
+    return S_OK;
+  }
+  STDMETHODIMP QueryActiveShellView(IShellView** view) override { *view = nullptr; return E_NOTIMPL; }
+  STDMETHODIMP OnViewWindowActive(IShellView*) override { return S_OK; }
+  STDMETHODIMP SetToolbarItems(LPTBBUTTONSB, UINT, UINT) override { return S_OK; }
+ private:
+  HWND frame_;
+};
+
+}  // namespace bench

@@ -14,36 +14,12 @@
 #include <sstream>
 #include <thread>
 
+#include "config/sheet_driver.h"
 #include "shell/shell_test_util.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
 
 namespace {
-
-const wchar_t kFolder[] = L"::{20D04FE0-3AEA-1069-A2D8-08002B30309D}\\::{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}";
-
-// Every level's values, as one text: what "the store is unchanged" compares.
-std::wstring StoreText() {
-  std::wstring text;
-  HKEY levels = nullptr;
-  if (RegOpenKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, KEY_READ, &levels)) return text;
-  wchar_t name[256], value[256];
-  BYTE data[600];
-  for (DWORD i = 0, length = 256; !RegEnumKeyExW(levels, i, name, &length, nullptr, nullptr, nullptr, nullptr);
-       ++i, length = 256) {
-    HKEY level = nullptr;
-    RegOpenKeyExW(levels, name, 0, KEY_READ, &level);
-    text += name;
-    for (DWORD v = 0, valueLength = 256, size = sizeof(data);
-         !RegEnumValueW(level, v, value, &valueLength, nullptr, nullptr, data, &size);
-         ++v, valueLength = 256, size = sizeof(data))
-      text += L"|" + std::wstring(value) + L"=" + std::wstring(reinterpret_cast<wchar_t*>(data), size / 2);
-    RegCloseKey(level);
-    text += L"\n";
-  }
-  RegCloseKey(levels);
-  return text;
-}
 
 // Whether the peer's source was shown the copy effect during the drag.
 bool SawCopy(const std::string& report) {
@@ -93,7 +69,7 @@ class DropOnRootView : public testing::Test {
   void SetUp() override {
     SeedLevel(0, L"Alpha");
     SeedLevel(1, L"Beta");
-    before_ = StoreText();
+    before_ = sheet::StoredLevels();
     frame_ = CreateWindowExW(0, L"STATIC", nullptr, WS_POPUP | WS_VISIBLE, 0, 0, 400, 300, nullptr, nullptr, nullptr,
                              nullptr);
     ASSERT_EQ(CoCreateInstance(CLSID_ExplorerBrowser, nullptr, CLSCTX_INPROC_SERVER, IID_IExplorerBrowser,
@@ -102,7 +78,7 @@ class DropOnRootView : public testing::Test {
     FOLDERSETTINGS settings{FVM_DETAILS, 0};
     ASSERT_EQ(browser_->Initialize(frame_, &rect, &settings), S_OK);
     UniqueList folder;
-    ASSERT_EQ(SHParseDisplayName(kFolder, nullptr, folder.Put(), 0, nullptr), S_OK);
+    ASSERT_EQ(SHParseDisplayName(kFolderPath, nullptr, folder.Put(), 0, nullptr), S_OK);
     ASSERT_EQ(browser_->BrowseToIDList(folder.Get(), SBSP_ABSOLUTE), S_OK);
     com::ComPtr<IShellView> view;
     HWND window = nullptr;
@@ -114,7 +90,7 @@ class DropOnRootView : public testing::Test {
     ASSERT_TRUE(target_) << "the list is a registered target";
   }
   void TearDown() override {
-    EXPECT_EQ(StoreText(), before_) << "no level changed";
+    EXPECT_EQ(sheet::StoredLevels(), before_) << "no level changed";
     EXPECT_FALSE(FindWindowW(L"#32770", nullptr)) << "no dialog came up";
     if (browser_) browser_->Destroy();
     browser_.Reset();
@@ -167,7 +143,7 @@ class DropOnRootView : public testing::Test {
   HWND list_ = nullptr;
   IDropTarget* target_ = nullptr;
   com::ComPtr<IExplorerBrowser> browser_;
-  std::wstring before_;
+  std::vector<std::wstring> before_;
 };
 
 // Copy is offered while the files are over a level row, which alone is selected; the drop
@@ -193,7 +169,7 @@ TEST_F(DropOnRootView, FilesFromAnotherProcessLightUpALevelAndAreRefused) {
 // drop: the instrument is never asked.
 TEST_F(DropOnRootView, TheVirtualFileOfALevelIsRefusedWithoutATransfer) {
   std::vector<int> seen;
-  std::string report = DragOnto(2, std::wstring(kFolder) + L"\\Alpha\\file1.tkf", seen);
+  std::string report = DragOnto(2, std::wstring(kFolderPath) + L"\\Alpha\\file1.tkf", seen);
   EXPECT_EQ(seen, std::vector<int>{2});
   EXPECT_TRUE(SawCopy(report)) << report;
   EXPECT_NE(report.find("result 0x80070057 7"), std::string::npos) << report;
@@ -206,7 +182,7 @@ TEST_F(DropOnRootView, TheRegisteredTargetRefusesTheAddRowEmptySpaceAndAGoneView
   ASSERT_EQ(SHGetDesktopFolder(desktop.Put()), S_OK);
   com::ComPtr<IDataObject> data;
   UniqueList folder;
-  ASSERT_EQ(SHParseDisplayName(kFolder, nullptr, folder.Put(), 0, nullptr), S_OK);
+  ASSERT_EQ(SHParseDisplayName(kFolderPath, nullptr, folder.Put(), 0, nullptr), S_OK);
   LPCITEMIDLIST items[] = {folder.Get()};
   ASSERT_EQ(desktop->GetUIObjectOf(nullptr, 1, items, IID_IDataObject, nullptr, data.PutVoid()), S_OK);
   ASSERT_EQ(target_->DragEnter(data.Get(), MK_LBUTTON, POINTL{RowPoint(1).x, RowPoint(1).y}, nullptr), S_OK)

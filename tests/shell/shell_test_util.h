@@ -11,6 +11,8 @@
 using UniqueList = win::UniqueCoMem<ITEMIDLIST>;
 using IdList = std::vector<std::pair<tagPIDLTYPE, std::wstring>>;
 const std::wstring kParsingRoot = L"::{D8B818CA-E47C-49a1-96A5-C2AA5FB57F15}";
+// The registered folder under My Computer, as the shell parses it.
+const wchar_t kFolderPath[] = L"::{20D04FE0-3AEA-1069-A2D8-08002B30309D}\\::{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}";
 
 UniqueList MakeId(tagPIDLTYPE type, const wchar_t* text);
 UniqueList MakeFull(const wchar_t* path);  // e.g. L"Marlix Digital Levels\\Alpha\\file1.tkf"

@@ -18,6 +18,10 @@
 #include "support/registry_sandbox.h"
 
 namespace {
+std::wstring Path(IShellFolder* folder, bool parsing) {
+  wchar_t path[MAX_PATH];
+  return static_cast<CMarlixDLShellFolder*>(folder)->GetFolderPath(path, MAX_PATH, parsing) ? path : L"<failed>";
+}
 const wchar_t kRoot[] = L"\\Marlix Digital Levels";
 
 // The pixels of a square drawn on white.
@@ -94,9 +98,13 @@ class ShellFolder : public Shell {
   com::ComPtr<IShellFolder> level_ = Bind(root_.Get(), alpha_.Get());
 };
 
-// Paths and enumeration through the folder are the shell32 client's; here what it can't reach.
-TEST_F(ShellFolder, BindsLevelsOnlyFitsItsPathAndValidatesOnlyTheFirstItemsAttributes) {
+// Enumeration through the folder is the shell32 client's test.
+TEST_F(ShellFolder, PathsBindingAndAttributesOfTheFirstItemOnly) {
   EXPECT_EQ(initialized_, S_OK);
+  EXPECT_EQ(Path(root_.Get(), false), L"\\Marlix Digital Levels");
+  EXPECT_EQ(Path(root_.Get(), true), kParsingRoot);
+  EXPECT_EQ(Path(level_.Get(), false), L"\\Marlix Digital Levels\\Alpha");
+  EXPECT_EQ(Path(level_.Get(), true), kParsingRoot + L"\\Alpha");
   wchar_t tiny[8];
   EXPECT_FALSE(root_->GetFolderPath(tiny, 8, false));
   EXPECT_FALSE(root_->GetFolderPath(nullptr, 8, false));

@@ -198,15 +198,5 @@ TEST_F(StationSheet, RenameByApplyThenOkLosesTheSecondSaveWithoutAWord) {
   EXPECT_EQ(StoredLevels(), Strings{L"B|1|9600|1|0|8|0|1|first|HRA20"}) << "the OK looked for A";
 }
 
-TEST_F(StationSheet, CancelStoresNothingAndEndsWithCancel) {
-  Stored(L"Kept", L"note");
-  CStationRecord level = Level(L"Kept");
-  EXPECT_EQ(RunSheet(level, false, [](HWND sheet) {
-    Type(Page(sheet, 0), 204, L"changed");
-    Press(sheet, IDCANCEL);
-  }), IDCANCEL);
-  EXPECT_EQ(StoredLevels(), Strings{L"Kept|1|9600|1|0|8|0|1|note|HRA20"});
-}
-
 // Run by scripts/sheet-screenshots.
 TEST_F(StationSheet, DISABLED_Screenshots) { TakeScreenshots(L"sheet-en"); }

@@ -43,24 +43,22 @@ inline void Type(HWND page, int id, const std::wstring& text) {
   for (wchar_t c : text) SendMessageW(edit, WM_CHAR, c, 0);
 }
 
+inline std::wstring Entry(HWND combo, LRESULT at) {
+  wchar_t text[256] = {};
+  SendMessageW(combo, CB_GETLBTEXT, static_cast<WPARAM>(at), reinterpret_cast<LPARAM>(text));
+  return text;
+}
+
 inline std::vector<std::wstring> Entries(HWND page, int id) {
   HWND combo = GetDlgItem(page, id);
   std::vector<std::wstring> entries;
-  for (LRESULT i = 0, n = SendMessageW(combo, CB_GETCOUNT, 0, 0); i < n; ++i) {
-    wchar_t text[256] = {};
-    SendMessageW(combo, CB_GETLBTEXT, static_cast<WPARAM>(i), reinterpret_cast<LPARAM>(text));
-    entries.push_back(text);
-  }
+  for (LRESULT i = 0, n = SendMessageW(combo, CB_GETCOUNT, 0, 0); i < n; ++i) entries.push_back(Entry(combo, i));
   return entries;
 }
 
 inline std::wstring Selected(HWND page, int id) {
-  HWND combo = GetDlgItem(page, id);
-  LRESULT at = SendMessageW(combo, CB_GETCURSEL, 0, 0);
-  if (at == CB_ERR) return L"<none>";
-  wchar_t text[256] = {};
-  SendMessageW(combo, CB_GETLBTEXT, static_cast<WPARAM>(at), reinterpret_cast<LPARAM>(text));
-  return text;
+  LRESULT at = SendMessageW(GetDlgItem(page, id), CB_GETCURSEL, 0, 0);
+  return at == CB_ERR ? L"<none>" : Entry(GetDlgItem(page, id), at);
 }
 
 // Chooses the entry as the list does for a click: select, then notify the page.
@@ -128,10 +126,6 @@ inline void SetSerialPorts(const std::vector<std::pair<std::wstring, std::wstrin
   RegDeleteTreeW(HKEY_LOCAL_MACHINE, path.c_str());
   for (const auto& [name, port] : ports) RegWriteString(HKEY_LOCAL_MACHINE, path, name.c_str(), port);
 }
-
-}  // namespace sheet
-
-namespace sheet {
 
 // Saves what the screen shows of `window` as a 24-bit BMP (for the pictures in docs/).
 inline bool SaveScreenshot(HWND window, const std::wstring& path) {

@@ -1,6 +1,5 @@
 #include <gtest/gtest.h>
 
-#include "base/module_instance.h"
 #include "base/resource_ids.h"
 #include "config/sheet_driver.h"
 #include "store/string_table.h"
@@ -31,71 +30,7 @@ struct StationSheet : testing::Test {
   RegistrySandbox sandbox{{HKEY_CURRENT_USER, HKEY_LOCAL_MACHINE}};
 };
 
-// One control of a dialog template: id, class atom (0x80 button .. 0x85 combo box), rectangle, style.
-struct TemplateItem {
-  int id, atom, x, y, cx, cy;
-  DWORD style;
-  bool operator==(const TemplateItem&) const = default;
-};
-void PrintTo(const TemplateItem& i, std::ostream* os) {
-  *os << i.id << " atom " << std::hex << i.atom << std::dec << " (" << i.x << "," << i.y << "," << i.cx << "," << i.cy
-      << ") style 0x" << std::hex << i.style;
-}
-
-// Reads a classic DIALOG resource: title, size, font and the controls in tab order.
-struct Template {
-  std::wstring title, font;
-  int cx = 0, cy = 0, points = 0;
-  std::vector<TemplateItem> items;
-};
-Template ReadTemplate(UINT id) {
-  HRSRC found = FindResourceW(ModuleInstance(), MAKEINTRESOURCEW(id), MAKEINTRESOURCEW(5));
-  auto* words = static_cast<const WORD*>(LockResource(LoadResource(ModuleInstance(), found)));
-  auto* head = reinterpret_cast<const DLGTEMPLATE*>(words);
-  Template t{.cx = head->cx, .cy = head->cy};
-  const WORD* p = words + sizeof(DLGTEMPLATE) / 2;
-  auto text = [&p] { std::wstring s(reinterpret_cast<const wchar_t*>(p)); p += s.size() + 1; return s; };
-  auto skip = [&p, &text] { if (*p == 0xFFFF) p += 2; else text(); };
-  skip(), skip();  // menu, class
-  t.title = text();
-  t.points = *p++;
-  t.font = text();
-  for (int i = 0; i < head->cdit; ++i) {
-    p = reinterpret_cast<const WORD*>((reinterpret_cast<ULONG_PTR>(p) + 3) & ~ULONG_PTR(3));
-    auto* item = reinterpret_cast<const DLGITEMTEMPLATE*>(p);
-    p += sizeof(DLGITEMTEMPLATE) / 2;
-    int atom = p[0] == 0xFFFF ? p[1] : -1;
-    skip(), skip();  // class, text
-    p += 1 + *p / 2;  // creation data
-    t.items.push_back({item->id, atom, item->x, item->y, item->cx, item->cy, item->style & ~DWORD(WS_CHILD | WS_VISIBLE | WS_GROUP)});
-  }
-  return t;
-}
-
 }  // namespace
-
-TEST(StationTemplates, LayoutIdsTabOrderAndStyles) {
-  const DWORD edit = ES_AUTOHSCROLL | WS_BORDER | WS_TABSTOP, list = CBS_DROPDOWNLIST | WS_VSCROLL | WS_TABSTOP,
-              sorted = list | CBS_SORT;
-  Template general = ReadTemplate(IDD_STATION_GENERAL), advanced = ReadTemplate(IDD_STATION_ADVANCED);
-  EXPECT_EQ(general.title, L"General");
-  EXPECT_EQ(advanced.title, L"Advanced");
-  for (const Template& t : {general, advanced}) EXPECT_EQ(t.font + L" " + std::to_wstring(t.points), L"MS Sans Serif 8");
-  EXPECT_EQ(std::make_pair(general.cx, general.cy), std::make_pair(192, 126));
-  EXPECT_EQ(std::make_pair(advanced.cx, advanced.cy), std::make_pair(192, 127));
-  EXPECT_EQ(general.items, (std::vector<TemplateItem>{
-                               {310, 0x82, 5, 5, 45, 10, 0}, {203, 0x81, 60, 5, 125, 15, edit},
-                               {311, 0x82, 5, 35, 45, 10, 0}, {204, 0x81, 60, 25, 125, 35, edit},
-                               {312, 0x82, 5, 65, 45, 10, 0}, {205, 0x85, 60, 65, 125, 45, sorted},
-                               {313, 0x82, 5, 85, 50, 10, 0}, {206, 0x85, 60, 85, 125, 45, sorted}}));
-  EXPECT_EQ(advanced.items, (std::vector<TemplateItem>{
-                                {314, 0x82, 5, 5, 45, 10, 0}, {208, 0x85, 60, 5, 125, 45, list},
-                                {316, 0x82, 5, 25, 45, 10, 0}, {210, 0x85, 60, 25, 125, 45, list},
-                                {315, 0x82, 5, 45, 45, 10, 0}, {209, 0x85, 60, 45, 125, 45, list},
-                                {317, 0x82, 5, 65, 45, 10, 0}, {211, 0x85, 60, 65, 125, 45, list},
-                                {322, 0x82, 5, 85, 45, 10, 0}, {219, 0x85, 60, 85, 125, 45, list},
-                                {321, 0x82, 5, 105, 45, 10, 0}, {218, 0x85, 60, 105, 125, 45, list}}));
-}
 
 TEST(SerialPorts, PortNumberFromTheFirstDigitOn) {
   EXPECT_EQ(PortNumberOf(L"COM12"), 12);
@@ -261,16 +196,6 @@ TEST_F(StationSheet, RenameByApplyThenOkLosesTheSecondSaveWithoutAWord) {
     Press(sheet, IDOK);
   }), IDOK);
   EXPECT_EQ(StoredLevels(), Strings{L"B|1|9600|1|0|8|0|1|first|HRA20"}) << "the OK looked for A";
-}
-
-TEST_F(StationSheet, CancelStoresNothingAndEndsWithCancel) {
-  Stored(L"Kept", L"note");
-  CStationRecord level = Level(L"Kept");
-  EXPECT_EQ(RunSheet(level, false, [](HWND sheet) {
-    Type(Page(sheet, 0), 204, L"changed");
-    Press(sheet, IDCANCEL);
-  }), IDCANCEL);
-  EXPECT_EQ(StoredLevels(), Strings{L"Kept|1|9600|1|0|8|0|1|note|HRA20"});
 }
 
 // Run by scripts/sheet-screenshots.

@@ -1,7 +1,6 @@
 # The instrument side of transfer: the library contract, the stand-in, the download
 # dialog and the change notification among views.
 marlix_test(comm_tests SOURCES
-  ${CMAKE_CURRENT_SOURCE_DIR}/comm_interface_test.cpp
   ${CMAKE_CURRENT_SOURCE_DIR}/download_dialog_test.cpp)
 # A folder of its own: the stand-in's control file and log live beside the program.
 set_target_properties(comm_tests PROPERTIES RUNTIME_OUTPUT_DIRECTORY ${CMAKE_CURRENT_BINARY_DIR}/comm)

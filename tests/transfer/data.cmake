@@ -9,7 +9,6 @@ set(MARLIX_DATA_TEST_SUPPORT ${CMAKE_CURRENT_SOURCE_DIR}/data_test_support.cpp
 
 marlix_test(data_tests SOURCES
   ${CMAKE_CURRENT_SOURCE_DIR}/data_object_test.cpp
-  ${CMAKE_CURRENT_SOURCE_DIR}/drop_target_test.cpp
   ${MARLIX_DATA_TEST_SUPPORT})
 set_target_properties(data_tests PROPERTIES RUNTIME_OUTPUT_DIRECTORY ${MARLIX_DATA_TEST_DIR})
 marlix_copy_standin(data_tests)

@@ -3,13 +3,17 @@
 #include <cstddef>
 #include <cstring>
 #include <fstream>
+#include <map>
 
 #include "data_test_support.h"
 #include "helpers/win_handles.h"
+#include "shell/shell_folder.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
+#include "server/class_creators.h"
 #include "transfer/data_object.h"
 #include "transfer/download_dialog.h"
+#include "transfer/drop_target.h"
 #include "transfer/enum_format_etc.h"
 #include "transfer/stream2.h"
 
@@ -260,6 +264,92 @@ TEST_F(Stream2, ReadsOnceOnlyTheShortReadDeletesAndAMissingFileGivesTheBareCode)
   EXPECT_EQ(stream.As(&s), S_OK);
   com::ComPtr<ISequentialStream> seq;
   EXPECT_EQ(stream.As(&seq), E_NOINTERFACE);
+}
+
+using Asked = std::vector<std::wstring>;
+
+// A source that answers queries for the formats it is given (none given: every format, with
+// S_OK), and notes what it was asked.
+struct Offers : com::ComObject<IDataObject> {
+  STDMETHODIMP GetData(FORMATETC*, STGMEDIUM*) override { return E_NOTIMPL; }
+  STDMETHODIMP GetDataHere(FORMATETC*, STGMEDIUM*) override { return E_NOTIMPL; }
+  STDMETHODIMP QueryGetData(FORMATETC* f) override {
+    wchar_t name[64] = L"CF_HDROP";
+    if (f->cfFormat != CF_HDROP) GetClipboardFormatNameW(f->cfFormat, name, 64);
+    asked.push_back(std::wstring(name) + (f->tymed == TYMED_ISTREAM ? L"/stream" : L"") +
+                    (f->dwAspect == DVASPECT_CONTENT && f->lindex == -1 && !f->ptd ? L"" : L"/odd"));
+    if (answers.empty()) return S_OK;
+    auto found = answers.find(name);
+    return found == answers.end() ? DV_E_FORMATETC : found->second;
+  }
+  STDMETHODIMP GetCanonicalFormatEtc(FORMATETC*, FORMATETC*) override { return E_NOTIMPL; }
+  STDMETHODIMP SetData(FORMATETC*, STGMEDIUM*, BOOL) override { return E_NOTIMPL; }
+  STDMETHODIMP EnumFormatEtc(DWORD, IEnumFORMATETC**) override { return E_NOTIMPL; }
+  STDMETHODIMP DAdvise(FORMATETC*, DWORD, IAdviseSink*, DWORD*) override { return E_NOTIMPL; }
+  STDMETHODIMP DUnadvise(DWORD) override { return E_NOTIMPL; }
+  STDMETHODIMP EnumDAdvise(IEnumSTATDATA**) override { return E_NOTIMPL; }
+  std::map<std::wstring, HRESULT> answers;
+  Asked asked;
+};
+
+// Files on disk, an id array, or both halves of a virtual file, asked in that order; only an
+// answer of exactly S_OK counts; a level's own view takes nothing. The list target is set up
+// over a real list window as a view of the folder sets it up.
+using ListTarget = DataObject;
+
+TEST_F(ListTarget, EnterAsksForFilesThenIdsThenBothHalvesOfAVirtualFile) {
+  HWND list = CreateWindowExW(0, WC_LISTVIEWW, nullptr, WS_POPUP, 0, 0, 100, 100, nullptr, nullptr, nullptr, nullptr);
+  auto root = com::Make<CMarlixDLShellFolder>();
+  ASSERT_EQ(root->Initialize(nullptr), S_OK);
+  com::ComPtr<IShellView> view;
+  ASSERT_EQ(root->CreateViewObject(nullptr, IID_IShellView, view.PutVoid()), S_OK);
+  auto target = com::Make<CMarlixDLDropTargetOnListView>();
+  const wchar_t *top = L"Marlix Digital Levels", *level = L"Marlix Digital Levels\\North";
+  const Asked three = {L"CF_HDROP", L"Shell IDList Array", L"FileGroupDescriptorW"};
+  const Asked four = {L"CF_HDROP", L"Shell IDList Array", L"FileGroupDescriptorW", L"FileContents/stream"};
+  const struct {
+    const char* what;
+    const wchar_t* folder;
+    std::map<std::wstring, HRESULT> answers;
+    HRESULT hr;
+    Asked asked;
+  } cases[] = {
+      {"contents without a descriptor", top, {{L"FileContents", S_OK}}, E_INVALIDARG, three},
+      {"a descriptor alone", top, {{L"FileGroupDescriptorW", S_OK}}, E_INVALIDARG, four},
+      {"both halves", top, {{L"FileGroupDescriptorW", S_OK}, {L"FileContents", S_OK}}, S_OK, four},
+      {"files", top, {{L"CF_HDROP", S_OK}}, S_OK, {L"CF_HDROP"}},
+      {"ids", top, {{L"Shell IDList Array", S_OK}}, S_OK, {L"CF_HDROP", L"Shell IDList Array"}},
+      {"S_FALSE and failures", top,
+       {{L"CF_HDROP", S_FALSE}, {L"Shell IDList Array", E_FAIL}, {L"FileGroupDescriptorW", S_FALSE}}, E_INVALIDARG, three},
+      {"contents answered S_FALSE", top, {{L"FileGroupDescriptorW", S_OK}, {L"FileContents", S_FALSE}}, E_INVALIDARG, four},
+      {"a level's own view", level, {}, E_INVALIDARG, {}}};
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.what);
+    auto data = com::Make<Offers>();
+    data->answers = c.answers;
+    win::UniqueCoMem<ITEMIDLIST> folder(CPidlMgr().CreateListFromPath(c.folder));
+    target->SetTarget(list, view.Get(), folder.Get());
+    DWORD effect = DROPEFFECT_LINK;
+    EXPECT_EQ(target->DragEnter(data.Get(), MK_LBUTTON, {0, 0}, &effect), c.hr);
+    EXPECT_EQ(effect, DWORD(DROPEFFECT_LINK)) << "DragEnter leaves the effect alone";
+    EXPECT_EQ(data->asked, c.asked);
+    target->SetTarget(nullptr, nullptr, nullptr);
+  }
+  DestroyWindow(list);
+}
+
+// Made by its class object, the list target has no list, view or folder to read.
+TEST_F(ListTarget, NobodySetUpRefusesWithoutTouchingAnything) {
+  com::ComPtr<IDropTarget> target;
+  ASSERT_EQ(CreateMarlixDLDropTargetOnListView(IID_IDropTarget, target.PutVoid()), S_OK);
+  auto data = com::Make<Offers>();
+  DWORD effect = DROPEFFECT_MOVE;
+  EXPECT_EQ(target->DragEnter(data.Get(), 0, {0, 0}, &effect), E_INVALIDARG);
+  EXPECT_EQ(target->DragOver(0, {0, 0}, &effect), E_INVALIDARG);
+  EXPECT_EQ(target->Drop(data.Get(), 0, {0, 0}, &effect), E_INVALIDARG);
+  EXPECT_EQ(target->DragLeave(), S_OK);
+  EXPECT_EQ(effect, DWORD(DROPEFFECT_MOVE));
+  EXPECT_TRUE(data->asked.empty());
 }
 
 }  // namespace

@@ -1,18 +1,25 @@
-// The download dialog driven as a person would, from a second thread, against the stand-in
-// library beside the test program: its control file MarlixComm.txt and its call log.
+// The library contract (table positions, the points block, the temporary target path, the
+// stand-in), the hidden window that carries changes to a view, and the download dialog driven
+// as a person would, from a second thread, against the stand-in library beside the test
+// program: its control file MarlixComm.txt and its call log.
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <atomic>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <functional>
 #include <memory>
 #include <thread>
+#include <utility>
 
 #include "helpers/error_reporter.h"
 #include "base/resource_ids.h"
 #include "store/string_table.h"
+#include "shell/view_notify.h"
 #include "support/window_waits.h"
+#include "transfer/comm_interface.h"
 #include "transfer/download_dialog.h"
 
 namespace {
@@ -40,6 +47,201 @@ std::vector<std::string> StandInLog() {
   return lines;
 }
 long long Count(const std::string& line) { return std::ranges::count(StandInLog(), line); }
+
+// A hand-made object with a 14-entry table, as the other compiler lays it out: each
+// entry records its position and first two arguments.
+struct FakeObject { void** table; int slot = -1; long long first = 0, second = 0; };
+template <int Slot>
+long long Entry(FakeObject* self, long long a, long long b) { *self = {self->table, Slot, a, b}; return 0; }
+
+TEST(CommInterface, CallsReachTheirTablePositions) {
+  void* table[14];
+  [&]<int... Slots>(std::integer_sequence<int, Slots...>) {
+    ((table[Slots] = reinterpret_cast<void*>(&Entry<Slots>)), ...);
+  }(std::make_integer_sequence<int, 14>());
+  FakeObject fake{table};
+  auto* comm = reinterpret_cast<IMarlixComm*>(&fake);
+  auto reached = [&](int slot, long long first) {  // 32 bits: the rest of an int's register is undefined
+    EXPECT_EQ(fake.slot, slot);
+    EXPECT_EQ(static_cast<int>(fake.first), static_cast<int>(first)) << "slot " << slot;
+  };
+  const char* path = "x";
+  comm->SetCommParameters(3, 19200, 2, 1, 1, 7, 0);
+  reached(2, 3);
+  comm->Initialize();
+  EXPECT_EQ(fake.slot, 3);
+  comm->ReceiveFile(20, true);
+  reached(4, 20);
+  EXPECT_EQ(static_cast<unsigned char>(fake.second), 1);
+  comm->SetPoints(nullptr);
+  reached(6, 0);
+  comm->TerminateConnection();
+  EXPECT_EQ(fake.slot, 8);
+  comm->SetFilePath(path);
+  reached(9, reinterpret_cast<long long>(path));
+  comm->SetTimeout(30);
+  reached(10, 30);
+  comm->SetCallback(&CommResultCallback);
+  reached(13, reinterpret_cast<long long>(&CommResultCallback));
+  comm->Destroy(1);
+  reached(0, 1);
+}
+
+// Read by byte offset, not through the struct the code writes with.
+TEST(CommInterface, PointsBlockPresetsBytes20And92OfEachRecord) {
+  PointsBlock* block = NewPointsBlock();
+  ASSERT_TRUE(block);
+  const auto* bytes = reinterpret_cast<const unsigned char*>(block);
+  int preset = 0;
+  for (size_t record = 0; record < 5000; ++record) {
+    for (size_t offset : {20u, 92u}) {
+      int32_t value = 0;
+      std::memcpy(&value, bytes + record * 144 + offset, sizeof(value));
+      preset += value == -1;
+    }
+  }
+  EXPECT_EQ(preset, 10000);
+  DeletePointsBlock(block);
+}
+
+TEST(CommInterface, CallbackPostsTheSignExtendedCodeToTheOpenDialogOnly) {
+  MSG message;
+  CommResultCallback(5);  // no dialog: a post to a null window would land in this thread's queue
+  EXPECT_FALSE(PeekMessageW(&message, nullptr, DownloadMessage, DownloadMessage, PM_REMOVE));
+  HWND target = CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, nullptr, nullptr);
+  ASSERT_NE(target, nullptr);
+  DownloadDialogWindow = target;
+  // From a thread of the library's; a sent message would time out here, as this thread pumps none.
+  auto library = [](void*) -> DWORD { CommResultCallback(-101); return 0; };
+  HANDLE thread = CreateThread(nullptr, 0, library, nullptr, 0, nullptr);
+  EXPECT_EQ(WaitForSingleObject(thread, 10000), WAIT_OBJECT_0);
+  CloseHandle(thread);
+  DownloadDialogWindow = nullptr;
+  ASSERT_TRUE(PeekMessageW(&message, target, DownloadMessage, DownloadMessage, PM_REMOVE));
+  EXPECT_EQ(message.wParam, 0u);
+  EXPECT_EQ(message.lParam, static_cast<LPARAM>(-101));
+  DestroyWindow(target);
+}
+
+
+TEST(CommInterface, TargetPathIsAFreshTkfNameWithoutExtensionInTheTempFolder) {
+  std::wstring first, second;
+  ASSERT_EQ(MakeDownloadTargetPath(first), 0u);
+  ASSERT_EQ(MakeDownloadTargetPath(second), 0u);
+  wchar_t temp[MAX_PATH] = {};
+  GetTempPathW(MAX_PATH, temp);
+  ASSERT_TRUE(first.starts_with(temp)) << first;
+  std::wstring name = first.substr(wcslen(temp));
+  EXPECT_TRUE(name.starts_with(L"TKF")) << name;
+  EXPECT_EQ(name.find_first_of(L".\\/"), std::wstring::npos) << name;
+  EXPECT_EQ(GetFileAttributesW((first + L".tmp").c_str()), INVALID_FILE_ATTRIBUTES);  // deleted again
+  EXPECT_NE(first, second);
+}
+
+// The stand-in honours the contract: each started transfer calls back, and Destroy
+// waits for the library's own thread before anything is freed.
+std::atomic<int> callbacks{0};
+TEST(StandIn, EveryReceiveFileCallsBack) {
+  ConfigureStandIn("delay_ms=50\n");
+  std::wstring error;
+  IMarlixComm* comm = CreateCommObject(error);
+  ASSERT_TRUE(comm) << testing::PrintToString(error);
+  comm->SetCallback([](int) { ++callbacks; });
+  char temp[MAX_PATH] = {}, target[MAX_PATH] = {};
+  GetTempPathA(MAX_PATH, temp);
+  GetTempFileNameA(temp, "TKF", 0, target);
+  comm->SetFilePath(target);
+  EXPECT_EQ(comm->ReceiveFile(20, true), 0);
+  EXPECT_EQ(comm->ReceiveFile(20, true), 0);
+  for (ULONGLONG end = GetTickCount64() + 5000; callbacks < 2 && GetTickCount64() < end;) Sleep(10);
+  comm->Destroy(1);
+  EXPECT_EQ(callbacks.load(), 2);
+  DeleteFileA(target);
+  DeleteFileA((std::string(target) + ".txt").c_str());
+}
+
+// The transfer dialog's template, read from the resource as the dialog manager reads it.
+TEST(DownloadTemplate, LayoutAndStyles) {
+  HRSRC found = FindResourceW(GetModuleHandleW(nullptr), MAKEINTRESOURCEW(213), RT_DIALOG);
+  ASSERT_TRUE(found);
+  const auto* dialog = static_cast<const DLGTEMPLATE*>(LockResource(LoadResource(GetModuleHandleW(nullptr), found)));
+  ASSERT_NE(dialog->style, 0xFFFF0001u) << "a plain template, not an extended one";
+  EXPECT_EQ(dialog->style, DWORD(WS_POPUP | WS_CAPTION | WS_SYSMENU | DS_MODALFRAME | DS_SETFONT | DS_SYSMODAL));
+  EXPECT_EQ(dialog->cx, 267);
+  EXPECT_EQ(dialog->cy, 178);
+  const WORD* at = reinterpret_cast<const WORD*>(dialog + 1);
+  WORD atom = 0;
+  auto text = [&] {  // a string, or 0xFFFF and an ordinal, which goes to `atom`
+    std::wstring read;
+    if (*at == 0xFFFF) {
+      atom = at[1];
+      at += 2;
+    } else {
+      read = reinterpret_cast<const wchar_t*>(at);
+      at += read.size() + 1;
+    }
+    return read;
+  };
+  text();  // menu
+  text();  // class
+  EXPECT_EQ(text(), L"Download file from Digital Level");
+  EXPECT_EQ(*at++, 8) << "points";
+  EXPECT_EQ(text(), L"MS Sans Serif");
+  const DWORD readOnlyText = ES_READONLY | ES_MULTILINE | ES_AUTOVSCROLL | WS_VSCROLL | WS_BORDER | WS_TABSTOP;
+  const struct { WORD id, atom; const wchar_t* text; RECT box; DWORD style; } expected[] = {
+      {IDCANCEL, 0x80, L"Cancel", {80, 157, 50, 14}, WS_TABSTOP},
+      {220, 0x80, L"Start", {140, 157, 50, 14}, WS_TABSTOP},
+      {215, 0x82, L"Status text", {45, 142, 215, 10}, 0},
+      {319, 0x82, L"Status:", {5, 142, 25, 10}, 0},
+      {214, 0x81, L"", {5, 5, 255, 112}, readOnlyText},
+      {320, 0x82, L"File name:", {5, 127, 35, 10}, 0},
+      {217, 0x82, L"Name", {45, 127, 215, 10}, 0},
+  };
+  ASSERT_EQ(dialog->cdit, std::size(expected));
+  for (const auto& e : expected) {
+    SCOPED_TRACE(testing::Message() << "control " << e.id);
+    const auto* item = reinterpret_cast<const DLGITEMTEMPLATE*>((reinterpret_cast<ULONG_PTR>(at) + 3) & ~ULONG_PTR(3));
+    at = reinterpret_cast<const WORD*>(item + 1);
+    atom = 0;
+    text();  // class
+    EXPECT_EQ(atom, e.atom);
+    EXPECT_EQ(text(), e.text);
+    at += 1 + *at / sizeof(WORD);  // creation data
+    EXPECT_EQ(item->id, e.id);
+    const RECT box{item->x, item->y, item->cx, item->cy};
+    EXPECT_TRUE(EqualRect(&box, &e.box));
+    EXPECT_EQ(item->style & e.style, e.style);
+    EXPECT_EQ(item->style & (WS_CHILD | WS_VISIBLE), DWORD(WS_CHILD | WS_VISIBLE));
+  }
+}
+
+// The hidden window hands the view its notification only, and lets go of its pair before it
+// is destroyed, so it can never outlive the pair holding it.
+TEST(ViewNotify, TheHiddenWindowPassesOnlyItsMessageAndLetsGoOfItsPairFirst) {
+  static HWND view, hidden;
+  static std::vector<UINT> reachedView;
+  static LONG_PTR pairAtDestroy = -1;
+  view = CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, nullptr, nullptr);
+  NotifyWindowPair pair;
+  ASSERT_EQ(CreateNotifyWindow(pair, view), S_OK);
+  hidden = pair.Hidden;
+  HHOOK hook = SetWindowsHookExW(WH_CALLWNDPROC, [](int code, WPARAM w, LPARAM l) -> LRESULT {
+    auto* call = reinterpret_cast<CWPSTRUCT*>(l);
+    if (call->hwnd == view && (call->message == GlobalNotifyMessage || call->message == DownloadMessage))
+      reachedView.push_back(call->message);
+    if (call->hwnd == hidden && call->message == WM_DESTROY) pairAtDestroy = GetWindowLongPtrW(hidden, GWLP_USERDATA);
+    return CallNextHookEx(nullptr, code, w, l);
+  }, nullptr, GetCurrentThreadId());
+  SendMessageW(hidden, DownloadMessage, 1, 1);
+  SendMessageW(hidden, GlobalNotifyMessage, 1, 2);
+  EXPECT_EQ(reachedView, std::vector<UINT>{GlobalNotifyMessage});
+  DestroyNotifyWindow(pair);
+  UnhookWindowsHookEx(hook);
+  EXPECT_EQ(pairAtDestroy, 0);
+  EXPECT_FALSE(IsWindow(hidden));
+  DestroyNotifyWindow(pair);  // a second time is harmless
+  DestroyWindow(view);
+}
 
 // Puts the block's free into the stand-in's log, so its order against Destroy shows.
 void LogFree(const PointsBlock* block) {

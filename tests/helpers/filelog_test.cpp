@@ -7,7 +7,6 @@
 #include "helpers/filelog.h"
 #include "helpers/stack_dump.h"
 #include "test_files.h"
-
 using namespace kld::ft;
 namespace {
 std::wstring LogPath() {
@@ -15,7 +14,6 @@ std::wstring LogPath() {
 }
 std::string Log() { return testfiles::ReadAll(LogPath()); }
 bool Has(const std::string& text, const std::string& part) { return text.find(part) != std::string::npos; }
-
 // Runs `write` with standard output sent to a scratch file, and gives what arrived there.
 template <class Write> std::string CaptureStdout(Write write) {
   const std::wstring path = testfiles::TempDirectory() + L"marlix_stdout.txt";
@@ -43,7 +41,6 @@ struct Collector : CStackDumpHandler {
   int begins = 0, ends = 0;
 };
 }  // namespace
-
 TEST_F(Filelog, EntriesCarryOnePrefixAndIndentFurtherLinesOrGoToStandardOutput) {
   EXPECT_FALSE(StartFilelog(L"marlix_logtest", false)) << "already open";
   EXPECT_EQ(FilelogPath(), NarrowText(LogPath()));
@@ -68,7 +65,6 @@ TEST_F(Filelog, EntriesCarryOnePrefixAndIndentFurtherLinesOrGoToStandardOutput) 
   EXPECT_EQ(CaptureStdout([] { LogTextA("narrow"); }), "") << "narrow text needs an open file";
   EXPECT_EQ(CaptureStdout([] { LogTextW(L"wide"); }), "wide\r\n") << "wide text has no such test";
 }
-
 // The prefix tells UTC; the test runs in a zone far from it.
 TEST_F(Filelog, PrefixIsUtc) {
   SYSTEMTIME utc, local;
@@ -80,7 +76,6 @@ TEST_F(Filelog, PrefixIsUtc) {
   const int logged = std::stoi(text.substr(0, 2)) * 60 + std::stoi(text.substr(3, 2));
   EXPECT_LE(std::abs(logged - (utc.wHour * 60 + utc.wMinute)) % (24 * 60 - 1), 1) << text;
 }
-
 // A file that can't be made at once is tried once more.
 HANDLE holder;
 TEST_F(Filelog, CreationIsTriedTwice) {
@@ -93,7 +88,6 @@ TEST_F(Filelog, CreationIsTriedTwice) {
   LogTextA("after the retry");
   EXPECT_TRUE(Has(Log(), "after the retry"));
 }
-
 // A file that can't be made at all still counts as started: the log just stays silent.
 TEST_F(Filelog, AFileThatCannotBeMadeStillAnswersTrue) {
   StopFilelog();
@@ -105,7 +99,6 @@ TEST_F(Filelog, AFileThatCannotBeMadeStillAnswersTrue) {
   CloseHandle(held);
   EXPECT_EQ(Log(), "");
 }
-
 TEST_F(Filelog, RestartDeletesOldLogsThenErrorsHeaderAndStreamsFollow) {
   const std::wstring old = testfiles::TempDirectory() + L"marlix_logtest_1.log",
                      other = testfiles::TempDirectory() + L"marlix_logtestx_1.log";
@@ -151,13 +144,11 @@ TEST_F(Filelog, RestartDeletesOldLogsThenErrorsHeaderAndStreamsFollow) {
   EXPECT_TRUE(Has(streamed, " one\r\n") && Has(streamed, " three\r\n") && !Has(streamed, "restored")) << streamed;
   EXPECT_TRUE(std::regex_search(streamed, std::regex(R"(\n {21}two\r\n)"))) << streamed;
 }
-
 // Kept out of line so that it stands as a frame of its own in the trace.
 extern "C" __attribute__((noinline)) void MarlixStackProbe(Collector* collector) {
   DumpThreadStack({GetCurrentThread(), collector});
   asm volatile("");
 }
-
 TEST(StackDump, NamesTheCallersOwnFunctionAndDumpsOtherThreads) {
   Collector own, other;
   MarlixStackProbe(&own);

@@ -5,7 +5,6 @@
 #include <fstream>
 #include <iterator>
 #include <string>
-
 namespace testfiles {
 inline void WriteBytes(const std::wstring& path, const std::string& bytes) {
   std::ofstream(std::filesystem::path(path), std::ios::binary) << bytes;
@@ -15,14 +14,11 @@ inline std::string ReadAll(const std::wstring& path) {
   std::ifstream in(std::filesystem::path(path), std::ios::binary);
   return in ? std::string(std::istreambuf_iterator<char>(in), {}) : "<none>";
 }
-inline std::string Bytes(const std::wstring& text) {
-  return std::string(reinterpret_cast<const char*>(text.data()), text.size() * sizeof(wchar_t));
-}
 // UTF-16LE with byte order mark, the only form translation files take.
-inline std::string Utf16File(const std::wstring& text) { return std::string("\xFF\xFE", 2) + Bytes(text); }
-inline void WriteTranslation(const std::wstring& path, const std::wstring& text) {
-  WriteBytes(path, Utf16File(text));
+inline std::string Utf16File(const std::wstring& text) {
+  return std::string("\xFF\xFE", 2) + std::string(reinterpret_cast<const char*>(text.data()), text.size() * 2);
 }
+inline void WriteTranslation(const std::wstring& path, const std::wstring& text) { WriteBytes(path, Utf16File(text)); }
 // Makes the application count as not installed, which puts its languages root beside it.
 inline void MarkNotInstalled(const std::wstring& app) {
   std::filesystem::create_directories(app + L"components");

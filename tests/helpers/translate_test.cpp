@@ -3,13 +3,11 @@
 #include <atomic>
 #include <random>
 #include <thread>
-#include <vector>
 #include "helpers/app_helpers.h"
 #include "helpers/translate_file.h"
 #include "helpers/translate_manager.h"
 #include "base/module_instance.h"
 #include "test_files.h"
-
 using namespace kld::ft;
 namespace {
 constexpr LANGID kEnglish = 1033, kGerman = 1031, kFrench = 1036;
@@ -25,7 +23,6 @@ HRESULT LoadBytes(const std::string& bytes, CTranslateFile* file) {
   DeleteFileW(path.c_str());
   return hr;
 }
-
 // Parses from the end of a page followed by an inaccessible one, so that any read past the text faults.
 void ParseAtPageEnd(CTranslateFile* file, const std::wstring& text) {
   const size_t bytes = text.size() * sizeof(wchar_t), page = 4096, pages = bytes / page + 1;
@@ -39,7 +36,6 @@ void ParseAtPageEnd(CTranslateFile* file, const std::wstring& text) {
   file->Parse(reinterpret_cast<const wchar_t*>(start), text.size());
   VirtualFree(base, 0, MEM_RELEASE);
 }
-
 // Puts the languages root beside the test program for the life of the fixture.
 struct TranslationFiles : testing::Test {
   void SetUp() override {
@@ -60,7 +56,6 @@ struct TranslationFiles : testing::Test {
   std::wstring app_, root_;
 };
 }  // namespace
-
 TEST(TranslateFile, EscapesPairingAndTails) {
   // \n goes first, and \t is replaced before a double backslash.
   const wchar_t* escapes[][2] = {{L"\\\\n", L"\\\n"}, {L"a\\tb\\rc\\\\d\\x", L"a\tb\rc\\d\\x"},
@@ -84,7 +79,6 @@ TEST(TranslateFile, EscapesPairingAndTails) {
   EXPECT_EQ(file.Size(), 7u);
   EXPECT_EQ(Parsed(L"[src]\n[last line]").Find(L"src", false), L"last line");
 }
-
 TEST(TranslateFile, LoadRefusesAnythingButUtf16WithMarkAndTakesHugeFiles) {
   struct { std::string bytes; HRESULT hr; const char* what; } rows[] = {
       {"", E_FAIL, "empty"},
@@ -105,7 +99,6 @@ TEST(TranslateFile, LoadRefusesAnythingButUtf16WithMarkAndTakesHugeFiles) {
   EXPECT_EQ(LoadBytes(testfiles::Utf16File(L"[k]\n[v]") + "\x5D", &file), S_OK);
   EXPECT_EQ(file.Find(L"k", false), L"v");
 }
-
 // Lines longer than any 16-bit count: no limit on a line, neither kept nor skipped.
 TEST(TranslateFile, LinesHaveNoLengthLimit) {
   const std::wstring longText(70000, L'x');
@@ -114,7 +107,6 @@ TEST(TranslateFile, LinesHaveNoLengthLimit) {
   EXPECT_EQ(file.Find(longText, false), L"long");
   EXPECT_EQ(file.Size(), 2u);
 }
-
 TEST(TranslateFile, RandomMutationsNeverReadPastTheEnd) {
   const std::wstring base =
       L"[Name:]\r\n[Name:]\r\n[Delete]\n[Löschen]\r[a\\nb]\n[c\\\\d]\n[]\n[x]y]\n[z]\r\n[tail";
@@ -143,7 +135,6 @@ TEST(TranslateFile, RandomMutationsNeverReadPastTheEnd) {
     ASSERT_EQ(LoadBytes(bytes, &file), S_OK);
   }
 }
-
 TEST_F(TranslationFiles, FourProbesInTheirOrder) {
   const CTranslateFileKey key{kEnglish, kGerman, L"probe"};
   EXPECT_EQ(FindTranslateFilePath(key), L"");
@@ -153,7 +144,6 @@ TEST_F(TranslationFiles, FourProbesInTheirOrder) {
   }
   EXPECT_EQ(FindTranslateFilePath({kGerman, kEnglish, L"probe"}), L"") << "files are keyed from English";
 }
-
 TEST_F(TranslationFiles, FirstPathFoundForANameServesEveryLanguage) {
   Write(L"de-DE\\shared.txt", L"[Open]\n[Öffnen]\n");
   Write(L"fr-FR\\shared.txt", L"[Open]\n[Ouvrir]\n");
@@ -181,7 +171,6 @@ TEST_F(TranslationFiles, FirstPathFoundForANameServesEveryLanguage) {
   ASSERT_TRUE(own);
   EXPECT_EQ(own->Find(L"x", false), L"y");
 }
-
 TEST_F(TranslationFiles, TranslateTextFallsBackToTheCutEnglishText) {
   Write(L"de-DE\\words.txt", L"[Delete]\n[Löschen]\n[Open#$menu]\n[Öffnen]\n");
   struct { const wchar_t *text, *result; LANGID from, to; const wchar_t* name = L"words"; } rows[] = {
@@ -194,7 +183,6 @@ TEST_F(TranslationFiles, TranslateTextFallsBackToTheCutEnglishText) {
     EXPECT_EQ(TranslateText(r.text, r.from, r.to, ModuleInstance(), r.name), r.result) << r.text << r.to;
   EXPECT_NE(TranslateFileManagerIfCreated(), nullptr);
 }
-
 // One thread probing a slow path holds up no other thread's translation.
 TEST_F(TranslationFiles, ProbingIsOutsideTheLock) {
   Write(L"de-DE\\quick.txt", L"[Start]\n[Starten]\n");
@@ -223,18 +211,4 @@ TEST_F(TranslationFiles, ProbingIsOutsideTheLock) {
   test_only::TranslateProbeHook = nullptr;
   CloseHandle(entered);
   CloseHandle(release);
-}
-
-TEST_F(TranslationFiles, ThreadsTranslatingAtOnceShareOneFile) {
-  Write(L"de-DE\\threads.txt", L"[Start]\n[Starten]\n");
-  std::atomic<int> translated{0};
-  std::vector<std::thread> threads;
-  for (int t = 0; t < 8; ++t)
-    threads.emplace_back([&translated] {
-      for (int i = 0; i < 200; ++i)
-        translated += TranslateText(L"Start", kEnglish, kGerman, ModuleInstance(),
-                                    i % 2 ? L"threads" : L"threads_missing") == (i % 2 ? L"Starten" : L"Start");
-    });
-  for (auto& thread : threads) thread.join();
-  EXPECT_EQ(translated.load(), 8 * 200);
 }

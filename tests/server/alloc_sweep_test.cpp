@@ -4,14 +4,12 @@
 #include <gtest/gtest.h>
 #include <objidl.h>
 #include <shlobj.h>
-
 #include <atomic>
 #include <cstdio>
 #include <cstdlib>
 #include <functional>
 #include <new>
 #include <utility>
-
 #include "server/class_creators.h"
 #include "server/class_ids.h"
 #include "server/com_base.h"
@@ -21,7 +19,6 @@
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
 #include "transfer/data_object.h"
-
 namespace {
 std::atomic<long> liveBlocks{0};  // operator new blocks not yet deleted
 std::atomic<long> liveTaskBlocks{0};  // task allocator blocks made while the spy was in
@@ -29,34 +26,29 @@ DWORD armedThread = 0;
 long allocations = 0;  // counted on the armed thread
 long failAt = 0;       // 0: none fails
 bool failed = false;
-
 // The row's own inputs are made with counting paused: only the module's calls are swept.
 struct Paused {
   Paused() : thread(std::exchange(armedThread, 0)) {}
   ~Paused() { armedThread = thread; }
   DWORD thread;
 };
-
 bool ShouldFail() noexcept {
   if (!armedThread || GetCurrentThreadId() != armedThread) return false;
   if (++allocations != failAt) return false;
   failed = true;
   return true;
 }
-
 void* Allocate(size_t size) noexcept {
   if (ShouldFail()) return nullptr;
   void* block = std::malloc(size ? size : 1);
   if (block) ++liveBlocks;
   return block;
 }
-
 void Release(void* block) noexcept {
   if (!block) return;
   --liveBlocks;
   std::free(block);
 }
-
 // The task allocator, through which item ids and returned strings go.
 class Spy final : public IMallocSpy {
  public:
@@ -90,7 +82,6 @@ class Spy final : public IMallocSpy {
   STDMETHODIMP_(void) PostHeapMinimize() override {}
 } spy;
 }  // namespace
-
 void* operator new(size_t size) {
   if (void* block = Allocate(size)) return block;
   throw std::bad_alloc();
@@ -104,21 +95,21 @@ void operator delete(void* block, size_t) noexcept { Release(block); }
 void operator delete[](void* block, size_t) noexcept { Release(block); }
 void operator delete(void* block, const std::nothrow_t&) noexcept { Release(block); }
 void operator delete[](void* block, const std::nothrow_t&) noexcept { Release(block); }
-
 namespace {
 const wchar_t kStore[] = L"Software\\Gravon\\Shell Extensions\\Marlix DL View\\Levels\\Station ";
-
 // What the host does in one row, releasing everything it got.
 struct Row {
   const char* name;
   std::function<void()> run;
 };
-
-UniqueList Id(tagPIDLTYPE type, const wchar_t* text) {
+template <class Make>
+auto Unswept(Make make) {
   Paused paused;
-  return MakeId(type, text);
+  return make();
 }
-
+UniqueList Id(tagPIDLTYPE type, const wchar_t* text) {
+  return Unswept([&] { return MakeId(type, text); });
+}
 com::ComPtr<IShellFolder> Root() {
   com::ComPtr<IShellFolder> root;
   if (FAILED(CreateMarlixDLShellFolder(IID_IShellFolder, root.PutVoid()))) return nullptr;
@@ -126,16 +117,6 @@ com::ComPtr<IShellFolder> Root() {
   if (root.As(&persist) != S_OK || persist->Initialize(nullptr) != S_OK) return nullptr;
   return root;
 }
-
-void FreeName(STRRET& name) {
-  if (name.uType == STRRET_WSTR) CoTaskMemFree(name.pOleStr);
-}
-
-template <class T>
-void ReleaseOut(T* object) {
-  if (object) object->Release();
-}
-
 void FolderBinding() {
   auto root = Root();
   if (!root) return;
@@ -144,11 +125,9 @@ void FolderBinding() {
   root->ParseDisplayName(nullptr, nullptr, name, nullptr, &parsed, nullptr);
   CoTaskMemFree(parsed);
   UniqueList alpha = Id(PIDL_LEVEL, L"Alpha level");
-  IShellFolder* level = nullptr;
-  root->BindToObject(alpha.Get(), nullptr, IID_IShellFolder, reinterpret_cast<void**>(&level));
-  ReleaseOut(level);
+  com::ComPtr<IShellFolder> level;
+  root->BindToObject(alpha.Get(), nullptr, IID_IShellFolder, level.PutVoid());
 }
-
 void FolderEnumeration() {
   auto root = Root();
   if (!root) return;
@@ -159,7 +138,6 @@ void FolderEnumeration() {
     list->Release();
   }
 }
-
 void FolderAnswers() {
   auto root = Root();
   if (!root) return;
@@ -170,49 +148,41 @@ void FolderAnswers() {
   root->CompareIDs(0, alpha.Get(), beta.Get());
   for (DWORD flags : {0x0000, 0x8000, 0x8001}) {
     STRRET name{};
-    if (root->GetDisplayNameOf(alpha.Get(), flags, &name) == S_OK) FreeName(name);
+    if (root->GetDisplayNameOf(alpha.Get(), flags, &name) == S_OK && name.uType == STRRET_WSTR)
+      CoTaskMemFree(name.pOleStr);
   }
 }
-
 void FolderItemObjects() {
   auto root = Root();
   if (!root) return;
   UniqueList alpha = Id(PIDL_LEVEL, L"Alpha level");
   LPCITEMIDLIST items[] = {alpha.Get()};
   for (REFIID riid : {IID_IExtractIconW, IID_IQueryInfo, IID_IDataObject, IID_IDropTarget}) {
-    IUnknown* object = nullptr;
-    if (root->GetUIObjectOf(nullptr, 1, items, riid, nullptr, reinterpret_cast<void**>(&object)) != S_OK) continue;
-    IQueryInfo* info = nullptr;
-    IDataObject* data = nullptr;
-    if (object->QueryInterface(IID_IQueryInfo, reinterpret_cast<void**>(&info)) == S_OK) {
+    com::ComPtr<IUnknown> object;
+    if (root->GetUIObjectOf(nullptr, 1, items, riid, nullptr, object.PutVoid()) != S_OK) continue;
+    com::ComPtr<IQueryInfo> info;
+    com::ComPtr<IDataObject> data;
+    if (object->QueryInterface(IID_IQueryInfo, info.PutVoid()) == S_OK) {
       LPWSTR tip = nullptr;
       if (info->GetInfoTip(0, &tip) == S_OK) EXPECT_NE(tip[0], L'\0') << "a tip object without its item";
       CoTaskMemFree(tip);
-      info->Release();
     }
-    if (object->QueryInterface(IID_IDataObject, reinterpret_cast<void**>(&data)) == S_OK) {
+    if (object.As(&data) == S_OK) {
       FORMATETC request = {static_cast<CLIPFORMAT>(RegisterClipboardFormatW(L"FileGroupDescriptorW")), nullptr,
                            DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
       STGMEDIUM medium{};
       HRESULT hr = data->GetData(&request, &medium);
       EXPECT_NE(hr, S_FALSE) << "a data object without its item";
       if (hr == S_OK) ReleaseStgMedium(&medium);
-      data->Release();
     }
-    object->Release();
   }
-  IUnknown* menu = nullptr;
-  root->CreateViewObject(nullptr, IID_IContextMenu, reinterpret_cast<void**>(&menu));
-  ReleaseOut(menu);
+  com::ComPtr<IUnknown> menu;
+  root->CreateViewObject(nullptr, IID_IContextMenu, menu.PutVoid());
 }
-
 void DataObjectFormats() {
   auto object = com::Make<CMarlixDLDataObject>();
   if (!object) return;
-  UniqueList alpha = [] {
-    Paused paused;
-    return MakeFull(L"Marlix Digital Levels\\Alpha level");
-  }();
+  UniqueList alpha = Unswept([] { return MakeFull(L"Marlix Digital Levels\\Alpha level"); });
   object->AddItem(alpha.Get());
   object->AddItem(alpha.Get());
   for (const wchar_t* format : {L"Preferred DropEffect", L"FileGroupDescriptorW", L"Shell IDList Array",
@@ -232,7 +202,6 @@ void DataObjectFormats() {
     formats->Release();
   }
 }
-
 // The least a browser must answer for a view to open in it; made with counting paused.
 class Browser : public com::ComObject<IShellBrowser> {
  public:
@@ -261,21 +230,8 @@ class Browser : public com::ComObject<IShellBrowser> {
   STDMETHODIMP OnViewWindowActive(IShellView*) override { return S_OK; }
   STDMETHODIMP SetToolbarItems(LPTBBUTTONSB, UINT, UINT) override { return S_OK; }
 };
-
-// Messages go on being handled until the view's worker has let go of the module.
-void PumpUntilUnlocked() {
-  for (ULONGLONG end = GetTickCount64() + 5000; com::ModuleLockCount() != 0 && GetTickCount64() < end;) {
-    MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT);
-    MSG message;
-    while (PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE)) DispatchMessageW(&message);
-  }
-}
-
 void ViewCreation() {
-  com::ComPtr<Browser> browser = [] {
-    Paused paused;
-    return com::Make<Browser>();
-  }();
+  com::ComPtr<Browser> browser = Unswept([] { return com::Make<Browser>(); });
   if (auto root = Root()) {
     IShellView* view = nullptr;
     if (root->CreateViewObject(nullptr, IID_IShellView, reinterpret_cast<void**>(&view)) == S_OK) {
@@ -288,9 +244,9 @@ void ViewCreation() {
   }
   Paused paused;
   browser.Reset();
-  PumpUntilUnlocked();
+  // Messages go on being handled until the view's worker has let go of the module.
+  PumpUntil([] { return com::ModuleLockCount() == 0; }, 5000);
 }
-
 void Registration() {
   CServerModule server;
   server.SetTypeLibId(LIBID_MarlixDLShellExtLib);
@@ -298,7 +254,6 @@ void Registration() {
   server.RegisterServer();
   server.UnregisterServer();
 }
-
 const Row kRows[] = {
     {"folder: initialize, parse and bind", FolderBinding},
     {"folder: enumeration", FolderEnumeration},
@@ -308,14 +263,12 @@ const Row kRows[] = {
     {"registration and unregistration", Registration},
     {"the view's creation, in a browser", ViewCreation},
 };
-
 class AllocationSweep : public testing::TestWithParam<Row> {
  protected:
   static void SetUpTestSuite() { ASSERT_EQ(CoRegisterMallocSpy(&spy), S_OK); }
   static void TearDownTestSuite() { CoRevokeMallocSpy(); }
   RegistrySandbox sandbox_{{HKEY_CLASSES_ROOT, HKEY_LOCAL_MACHINE, HKEY_CURRENT_USER}};
 };
-
 // Runs the row with the Nth allocation failing; false once a run met no failure.
 bool RunFailing(const Row& row, long n) {
   allocations = 0;
@@ -332,7 +285,6 @@ bool RunFailing(const Row& row, long n) {
   armedThread = 0;
   return failed;
 }
-
 TEST_P(AllocationSweep, NoExceptionNoLeakAndTheModuleUnloads) {
   const Row& row = GetParam();
   for (int n : {0, 1})
@@ -351,7 +303,6 @@ TEST_P(AllocationSweep, NoExceptionNoLeakAndTheModuleUnloads) {
   std::printf("[ swept    ] %s: %ld allocations\n", row.name, swept);
   EXPECT_GT(swept, 0);
 }
-
 INSTANTIATE_TEST_SUITE_P(Rows, AllocationSweep, testing::ValuesIn(kRows),
                          [](const testing::TestParamInfo<Row>& info) { return "Row" + std::to_string(info.index); });
 }  // namespace

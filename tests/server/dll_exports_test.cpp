@@ -4,8 +4,8 @@
 #include <tuple>
 #include "server/class_ids.h"
 #include "server/com_base.h"
+#include "server/object_map.h"
 #include "support/registry_sandbox.h"
-
 namespace {
 // The built MarlixDLShellExt.dll loaded into the test process, with its exports.
 struct LoadedDll {
@@ -27,7 +27,6 @@ struct LoadedDll {
   HRESULT(STDAPICALLTYPE* registerServer)() = nullptr;
   HRESULT(STDAPICALLTYPE* unregisterServer)() = nullptr;
 };
-
 struct DllExports : testing::Test {
   void SetUp() override {
     ASSERT_TRUE(dll_.module) << "cannot load " << testing::PrintToString(dll_.path);
@@ -36,7 +35,6 @@ struct DllExports : testing::Test {
   RegistrySandbox sandbox_;  // the module reads and writes the user's settings at load and unload
   LoadedDll dll_;
 };
-
 TEST_F(DllExports, ClassObjectsForTheMapOnly) {
   EXPECT_EQ(dll_.canUnloadNow(), S_OK);
   void* raw = reinterpret_cast<void*>(1);
@@ -45,18 +43,8 @@ TEST_F(DllExports, ClassObjectsForTheMapOnly) {
   EXPECT_EQ(dll_.getClassObject(IID_IUnknown, IID_IClassFactory, &raw), CLASS_E_CLASSNOTAVAILABLE);
   EXPECT_EQ(dll_.getClassObject(CLSID_MarlixDLShellFolder, IID_IClassFactory, nullptr), E_POINTER);
   // Every class of the map makes a real object.
-  const CLSID* const classes[] = {
-      &CLSID_MarlixDLShellFolder,
-      &CLSID_MarlixDLShellView,
-      &CLSID_MarlixDLEnumIDList,
-      &CLSID_MarlixDLExtractIcon,
-      &CLSID_MarlixDLDataObject,
-      &CLSID_MarlixDLQueryInfo,
-      &CLSID_MarlixDLDropTarget,
-      &CLSID_MarlixDLDropTargetOnListView,
-  };
-  for (size_t i = 0; i < std::size(classes); ++i) {
-    const CLSID* clsid = classes[i];
+  for (size_t i = 0; i < ModuleObjectMap().size(); ++i) {
+    const CLSID* clsid = ModuleObjectMap()[i].clsid;
     SCOPED_TRACE(testing::Message() << "class " << i);
     com::ComPtr<IClassFactory> factory;
     ASSERT_EQ(dll_.getClassObject(*clsid, IID_IClassFactory, factory.PutVoid()), S_OK);
@@ -79,7 +67,6 @@ TEST_F(DllExports, ClassObjectsForTheMapOnly) {
   EXPECT_EQ(dll_.getClassObject(CLSID_MarlixDLDataObject, IID_IDropTarget, unknown.PutVoid()), E_NOINTERFACE);
   EXPECT_EQ(dll_.canUnloadNow(), S_OK);
 }
-
 TEST_F(DllExports, LockServerHoldsTheModuleAndImageListsAreBuiltAtLoad) {
   com::ComPtr<IClassFactory> factory;
   ASSERT_EQ(dll_.getClassObject(CLSID_MarlixDLQueryInfo, IID_IClassFactory, factory.PutVoid()), S_OK);
@@ -102,7 +89,6 @@ TEST_F(DllExports, LockServerHoldsTheModuleAndImageListsAreBuiltAtLoad) {
     for (HICON h : {large, small}) if (h) DestroyIcon(h);
   }
 }
-
 TEST(DllLifetime, ColumnWidthsAreReadAtLoadAndWrittenBackAtUnload) {
   RegistrySandbox sandbox;
   const std::wstring base = L"Software\\Gravon\\Shell Extensions\\Marlix DL View";

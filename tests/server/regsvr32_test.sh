@@ -46,6 +46,7 @@ expect_line "attributes again" "000000A0" "$folder\\ShellFolder" /v Attributes
 regsvr /u
 expect_no_key "$folder"
 expect_no_key "$view"
+expect_no_key "HKCR\\TypeLib\\{1C83F5C4-5B89-4449-87FF-E494222081A6}\\$3"
 expect_no_key "$namespace\\{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}"
 expect_key "$namespace"
 expect_key "$approved"

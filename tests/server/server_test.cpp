@@ -1,41 +1,25 @@
 #include <gtest/gtest.h>
-#include <shlobj.h>
 #include <span>
 #include <string>
-#include <utility>
 #include <vector>
 #include "server/class_creators.h"
 #include "server/class_ids.h"
 #include "server/com_base.h"
 #include "server/registrar.h"
-#include "marlix_version.h"
 #include "base/resource_ids.h"
+#include "marlix_version.h"
 #include "server/server_module.h"
 #include "support/registry_sandbox.h"
-
 namespace {
 const HKEY kHKCR = HKEY_CLASSES_ROOT, kHKLM = HKEY_LOCAL_MACHINE;
 const wchar_t kModule[] = L"C:\\Some Dir\\Module.dll";
-struct Class { const CLSID* clsid; const wchar_t* name; const wchar_t* guid; };
-const Class kClasses[] = {  // the folder, the seven classes with a ProgID, then one in the type library only
-    {&CLSID_MarlixDLShellFolder, L"MarlixDLShellFolder", L"{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}"},
-    {&CLSID_MarlixDLShellView, L"MarlixDLShellView", L"{05F7AA87-193C-4ece-A11E-0F4C7703DB23}"},
-    {&CLSID_MarlixDLEnumIDList, L"MarlixDLEnumIDList", L"{5ED99E16-9878-487c-9BCB-552856BC0652}"},
-    {&CLSID_MarlixDLExtractIcon, L"MarlixDLExtractIcon", L"{0EC55AFE-FDF3-46f6-B30C-C458D72996BA}"},
-    {&CLSID_MarlixDLDataObject, L"MarlixDLDataObject", L"{FC3CF6F6-0DB9-4643-A589-89426A31A562}"},
-    {&CLSID_MarlixDLQueryInfo, L"MarlixDLQueryInfo", L"{5CEEEFDE-A499-429f-8384-734431E11F44}"},
-    {&CLSID_MarlixDLDropTarget, L"MarlixDLDropTarget", L"{E1AFE45B-6E62-433e-90D3-B299CCB76BC1}"},
-    {&CLSID_MarlixDLDropTargetOnListView, L"MarlixDLDropTargetOnListView", L"{3555C78D-F255-4f16-B260-7B365BF32995}"},
-    {&CLSID_MarlixDLContextMenu, L"MarlixDLContextMenu", nullptr},
-};
-const std::span<const Class> kProgIdClasses(kClasses + 1, 7);
-const std::wstring kFolderGuid = kClasses[0].guid, kFolderKey = L"CLSID\\" + kFolderGuid;
-const std::wstring kLibId = L"{1C83F5C4-5B89-4449-87FF-E494222081A6}", kTypeLibKey = L"TypeLib\\" + kLibId;
-const std::wstring kApproved = L"Software\\Microsoft\\Windows\\CurrentVersion\\Shell Extensions\\Approved";
-const std::wstring kNameSpace = L"Software\\Microsoft\\Windows\\CurrentVersion\\Explorer\\MyComputer\\NameSpace";
-const std::wstring kLevel = L"Software\\Gravon\\Shell Extensions\\Marlix DL View\\Levels\\Station 0";
+const std::wstring kFolderKey = L"CLSID\\{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}";
+const std::wstring kTypeLibKey = L"TypeLib\\{1C83F5C4-5B89-4449-87FF-E494222081A6}";
 const std::vector<BYTE> kAttributes = {0x00, 0x00, 0x00, 0xA0};
-
+// A map whose second entry names no script.
+const ObjectMapEntry kBroken[] = {{&CLSID_MarlixDLShellFolder, IDR_REG_SHELLFOLDER, CreateMarlixDLShellFolder},
+                                  {&CLSID_MarlixDLShellView, 999, CreateMarlixDLShellView},
+                                  {&CLSID_MarlixDLEnumIDList, IDR_REG_ENUMIDLIST, CreateMarlixDLEnumIDList}};
 TEST(Registrar, ScriptsWriteAndTakeBackAndSyntaxErrorsChangeNothing) {
   RegistrySandbox sandbox({kHKCR, kHKLM});
   RegWriteString(kHKLM, L"Shared", L"Other", L"kept");
@@ -69,14 +53,12 @@ TEST(Registrar, ScriptsWriteAndTakeBackAndSyntaxErrorsChangeNothing) {
   std::wstring path = ModuleFilePath(self);
   EXPECT_TRUE(path.size() > 4 && path.ends_with(L".exe")) << testing::PrintToString(path);
 }
-
 std::vector<BYTE> ReadAttributes() {  // empty unless a binary value
   BYTE data[16] = {};
   DWORD type = 0, size = sizeof(data);
   LONG rc = RegGetValueW(kHKCR, (kFolderKey + L"\\ShellFolder").c_str(), L"Attributes", RRF_RT_ANY, &type, data, &size);
   return rc == ERROR_SUCCESS && type == REG_BINARY ? std::vector<BYTE>(data, data + size) : std::vector<BYTE>();
 }
-
 struct ServerModule : testing::Test {
   void SetUp() override {
     server_.SetTypeLibId(LIBID_MarlixDLShellExtLib);
@@ -84,74 +66,9 @@ struct ServerModule : testing::Test {
   }
   RegistrySandbox sandbox_{{kHKCR, kHKLM, HKEY_CURRENT_USER}};
   CServerModule server_;
-  std::wstring module_ = ModuleFilePath(GetModuleHandleW(nullptr));
 };
-
-TEST_F(ServerModule, RegistrationWritesTheTablesAndReplacesThemWhenRepeated) {
-  ASSERT_EQ(server_.RegisterServer(), S_OK);
-  struct { HKEY root; std::wstring key; const wchar_t* value; std::wstring expected; } folder[] = {
-      {kHKCR, kFolderKey, nullptr, L"Marlix Digital Levels"},
-      {kHKCR, kFolderKey, L"InfoTip", L"Allows you to read files from Marlix Digital Levels"},
-      {kHKCR, kFolderKey + L"\\DefaultIcon", nullptr, module_ + L",0"},
-      {kHKCR, kFolderKey + L"\\InprocServer32", nullptr, module_},
-      {kHKCR, kFolderKey + L"\\InprocServer32", L"ThreadingModel", L"Apartment"},
-      {kHKCR, kFolderKey + L"\\TypeLib", nullptr, kLibId},
-      {kHKLM, kApproved, kFolderGuid.c_str(), L"Marlix Digital Levels"},
-      {kHKLM, kNameSpace + L"\\" + kFolderGuid, nullptr, L"Marlix Digital Levels"},
-  };
-  for (const auto& v : folder) EXPECT_EQ(RegReadString(v.root, v.key, v.value), v.expected) << v.key;
-  EXPECT_EQ(ReadAttributes(), kAttributes);
-  EXPECT_FALSE(RegKeyExists(kHKCR, L"MarlixDLShellExt.MarlixDLShellFolder"));
-  EXPECT_TRUE(RegKeyExists(kHKCR, kTypeLibKey + L"\\" MARLIX_TYPELIB_VERSION_WIDE));
-  for (const auto& c : kProgIdClasses) {
-    std::wstring name = c.name, progId = L"MarlixDLShellExt." + name, key = L"CLSID\\" + std::wstring(c.guid);
-    std::pair<std::wstring, std::wstring> values[] = {
-        {progId + L".1", name + L" Class"},       {progId + L".1\\CLSID", c.guid},
-        {progId, name + L" Class"},               {progId + L"\\CLSID", c.guid},
-        {progId + L"\\CurVer", progId + L".1"}, {key, name + L" Class"},
-        {key + L"\\ProgID", progId + L".1"},    {key + L"\\VersionIndependentProgID", progId},
-        {key + L"\\InprocServer32", module_},   {key + L"\\TypeLib", kLibId},
-    };
-    for (const auto& [path, expected] : values) EXPECT_EQ(RegReadString(kHKCR, path, nullptr), expected) << path;
-    EXPECT_EQ(RegReadString(kHKCR, key + L"\\InprocServer32", L"ThreadingModel"), L"Apartment");
-  }
-  RegWriteString(kHKCR, kFolderKey + L"\\Leftover", nullptr, L"stale");
-  RegWriteString(kHKCR, kFolderKey, L"Stray", L"stale");
-  RegDeleteKeyValueW(kHKCR, (kFolderKey + L"\\ShellFolder").c_str(), L"Attributes");
-  ASSERT_EQ(server_.RegisterServer(), S_OK);
-  EXPECT_FALSE(RegKeyExists(kHKCR, kFolderKey + L"\\Leftover")) << "registering again replaces the class keys";
-  EXPECT_EQ(RegReadString(kHKCR, kFolderKey, L"Stray"), L"<missing>");
-  EXPECT_EQ(ReadAttributes(), kAttributes);
-  EXPECT_EQ(RegReadString(kHKCR, kFolderKey, nullptr), L"Marlix Digital Levels");
-}
-
-TEST_F(ServerModule, UnregisteringKeepsParentsAndLevels) {
-  RegWriteString(HKEY_CURRENT_USER, kLevel, L"Name", L"Station 0");
-  RegWriteString(kHKLM, kApproved, L"{SomeoneElse}", L"Other");
-  EXPECT_EQ(server_.UnregisterServer(), S_OK) << "nothing registered yet";
-  ASSERT_EQ(server_.RegisterServer(), S_OK);
-  EXPECT_EQ(server_.UnregisterServer(), S_OK);
-  std::vector<std::wstring> gone = {kFolderKey, kTypeLibKey + L"\\" MARLIX_TYPELIB_VERSION_WIDE};
-  for (const auto& c : kProgIdClasses) {
-    std::wstring progId = L"MarlixDLShellExt." + std::wstring(c.name);
-    gone.insert(gone.end(), {progId, progId + L".1", L"CLSID\\" + std::wstring(c.guid)});
-  }
-  for (const std::wstring& key : gone) EXPECT_FALSE(RegKeyExists(kHKCR, key)) << key;
-  EXPECT_FALSE(RegKeyExists(kHKLM, kNameSpace + L"\\" + kFolderGuid));
-  EXPECT_EQ(RegReadString(kHKLM, kApproved, kFolderGuid.c_str()), L"<missing>");
-  EXPECT_EQ(RegReadString(kHKLM, kApproved, L"{SomeoneElse}"), L"Other");
-  EXPECT_TRUE(RegKeyExists(kHKCR, L"CLSID") && RegKeyExists(kHKLM, kNameSpace)) << "parents stay";
-  EXPECT_EQ(RegReadString(HKEY_CURRENT_USER, kLevel, L"Name"), L"Station 0");
-  EXPECT_EQ(server_.UnregisterServer(), S_OK);
-  ASSERT_EQ(server_.RegisterServer(), S_OK);
-  EXPECT_EQ(RegReadString(HKEY_CURRENT_USER, kLevel, L"Name"), L"Station 0");
-}
-
 TEST_F(ServerModule, FailedScriptLeavesAttributesUnwrittenAndNothingIsServedAfterTerm) {
-  const ObjectMapEntry broken[] = {{&CLSID_MarlixDLShellFolder, IDR_REG_SHELLFOLDER, CreateMarlixDLShellFolder},
-                                   {&CLSID_MarlixDLShellView, 999, CreateMarlixDLShellView},
-                                   {&CLSID_MarlixDLEnumIDList, IDR_REG_ENUMIDLIST, CreateMarlixDLEnumIDList}};
-  server_.Init(broken, GetModuleHandleW(nullptr));
+  server_.Init(kBroken, GetModuleHandleW(nullptr));
   EXPECT_EQ(server_.RegisterServer(), HRESULT_FROM_WIN32(ERROR_RESOURCE_NAME_NOT_FOUND));
   EXPECT_TRUE(RegKeyExists(kHKCR, kFolderKey + L"\\ShellFolder")) << "entries before it ran";
   EXPECT_TRUE(ReadAttributes().empty());
@@ -168,7 +85,6 @@ TEST_F(ServerModule, FailedScriptLeavesAttributesUnwrittenAndNothingIsServedAfte
   EXPECT_FALSE(RegKeyExists(kHKCR, kFolderKey));
   EXPECT_EQ(server_.UnregisterServer(), S_OK);
 }
-
 TEST(ObjectMap, EightEntriesInTheirOrderWithTheirScripts) {
   const std::pair<const CLSID*, UINT> expected[] = {
       {&CLSID_MarlixDLShellFolder, 6},
@@ -187,69 +103,21 @@ TEST(ObjectMap, EightEntriesInTheirOrderWithTheirScripts) {
     EXPECT_EQ(map[i].script, expected[i].second) << "entry " << i;
   }
 }
-
 // A failed entry ends the unregistration of entries and of the type library.
 TEST_F(ServerModule, UnregisteringStopsAtAFailedEntry) {
   ASSERT_EQ(server_.RegisterServer(), S_OK);
-  const ObjectMapEntry broken[] = {{&CLSID_MarlixDLShellFolder, IDR_REG_SHELLFOLDER, CreateMarlixDLShellFolder},
-                                   {&CLSID_MarlixDLShellView, 999, CreateMarlixDLShellView},
-                                   {&CLSID_MarlixDLEnumIDList, IDR_REG_ENUMIDLIST, CreateMarlixDLEnumIDList}};
-  server_.Init(broken, GetModuleHandleW(nullptr));
+  server_.Init(kBroken, GetModuleHandleW(nullptr));
   EXPECT_EQ(server_.UnregisterServer(), S_OK);
   EXPECT_FALSE(RegKeyExists(kHKCR, kFolderKey));
   EXPECT_TRUE(RegKeyExists(kHKCR, L"MarlixDLShellExt.MarlixDLEnumIDList"));
   EXPECT_TRUE(RegKeyExists(kHKCR, kTypeLibKey + L"\\" MARLIX_TYPELIB_VERSION_WIDE));
 }
-
 // Whatever failed before, "Attributes" is removed.
 TEST_F(ServerModule, UnregisteringRemovesAttributesAfterAFailure) {
-  const ObjectMapEntry broken[] = {{&CLSID_MarlixDLShellView, 999, CreateMarlixDLShellView},
-                                   {&CLSID_MarlixDLShellFolder, IDR_REG_SHELLFOLDER, CreateMarlixDLShellFolder}};
-  server_.Init(broken, GetModuleHandleW(nullptr));
+  server_.Init(std::span(kBroken + 1, 1), GetModuleHandleW(nullptr));
   RegSetKeyValueW(kHKCR, (kFolderKey + L"\\ShellFolder").c_str(), L"Attributes", REG_BINARY, kAttributes.data(), 4);
   EXPECT_EQ(server_.UnregisterServer(), S_OK);
   EXPECT_TRUE(RegKeyExists(kHKCR, kFolderKey + L"\\ShellFolder"));
   EXPECT_TRUE(ReadAttributes().empty());
-}
-
-template <class T>  // the name and help text of a type library (index -1) or of one of its entries
-std::pair<std::wstring, std::wstring> Documentation(T* owner, int index) {
-  BSTR name = nullptr, help = nullptr;
-  owner->GetDocumentation(index, &name, &help, nullptr, nullptr);
-  std::pair<std::wstring, std::wstring> doc(name ? name : L"", help ? help : L"");
-  SysFreeString(name);
-  SysFreeString(help);
-  return doc;
-}
-
-TEST(TypeLibrary, EmbeddedLibraryListsTheClassesAndTheViewInterface) {
-  com::ComPtr<ITypeLib> lib;
-  ASSERT_EQ(LoadTypeLibEx(ModuleFilePath(GetModuleHandleW(nullptr)).c_str(), REGKIND_NONE, lib.Put()), S_OK);
-  TLIBATTR* attr = nullptr;
-  ASSERT_EQ(lib->GetLibAttr(&attr), S_OK);
-  EXPECT_TRUE(IsEqualGUID(attr->guid, LIBID_MarlixDLShellExtLib));
-  EXPECT_EQ(std::make_tuple(attr->wMajorVerNum, attr->wMinorVerNum, attr->syskind),
-            std::make_tuple(MARLIX_VERSION_MAJOR, MARLIX_VERSION_MINOR, SYS_WIN64));
-  lib->ReleaseTLibAttr(attr);
-  EXPECT_EQ(Documentation(lib.Get(), -1),
-            std::make_pair(std::wstring(L"MarlixDLShellExtLib"), std::wstring(L"MarlixDLShellExt 1.0 Type Library")));
-  for (const auto& c : kClasses) {
-    SCOPED_TRACE(testing::PrintToString(c.name));
-    com::ComPtr<ITypeInfo> info;
-    ASSERT_EQ(lib->GetTypeInfoOfGuid(*c.clsid, info.Put()), S_OK);
-    TYPEATTR* type = nullptr;
-    ASSERT_EQ(info->GetTypeAttr(&type), S_OK);
-    EXPECT_EQ(type->typekind, TKIND_COCLASS);
-    info->ReleaseTypeAttr(type);
-    EXPECT_EQ(Documentation(info.Get(), MEMBERID_NIL).second, std::wstring(c.name) + L" Class");
-  }
-  com::ComPtr<ITypeInfo> view;
-  ASSERT_EQ(lib->GetTypeInfoOfGuid(IID_IMarlixDigitalLevelsShellView, view.Put()), S_OK);
-  TYPEATTR* type = nullptr;
-  ASSERT_EQ(view->GetTypeAttr(&type), S_OK);
-  EXPECT_EQ(type->typekind, TKIND_INTERFACE);
-  EXPECT_EQ(type->cFuncs, 0) << "nothing beyond IUnknown";
-  view->ReleaseTypeAttr(type);
-  EXPECT_TRUE(IsEqualIID(__uuidof(IMarlixDigitalLevelsShellView), IID_IMarlixDigitalLevelsShellView));
 }
 }  // namespace

@@ -2,38 +2,31 @@
 // The parent starts copies of this program, each running the Child test on the parent's
 // sandbox; all start together, and all check their view once every one has finished.
 #include <gtest/gtest.h>
-
 #include <cstdio>
 #include <map>
 #include <string>
 #include <vector>
-
 #include "helpers/win_handles.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
-
 namespace {
 constexpr int kProcesses = 20;
 constexpr int kLevelsEach = 10;
 const wchar_t kResults[] = L"Software\\Marlix store processes";
 const wchar_t kChildVariable[] = L"MARLIX_STORE_CHILD";  // "<index>|<barrier prefix>|<scratch key>"
-
 std::wstring Variable(const wchar_t* name) {
   wchar_t value[1024] = {};
   return GetEnvironmentVariableW(name, value, 1024) ? value : L"";
 }
-
 std::wstring LevelName(int process, int level, bool renamed) {
   return L"p" + std::to_wstring(process) + L"-" + std::to_wstring(level) + (renamed ? L" renamed" : L"");
 }
-
 CStationRecord Level(const std::wstring& name, int port) {
   CStationRecord record;
   record.Name = name;
   record.Port = port;
   return record;
 }
-
 TEST(StoreProcesses, Child) {
   const std::wstring setting = Variable(kChildVariable);
   if (setting.empty()) GTEST_SKIP() << "started by TwentyAtOnce only";
@@ -49,7 +42,6 @@ TEST(StoreProcesses, Child) {
   win::UniqueHandle done(OpenSemaphoreW(SEMAPHORE_MODIFY_STATE, FALSE, (barrier + L"done").c_str()));
   ASSERT_TRUE(go && check && done);
   ASSERT_EQ(WaitForSingleObject(go.Get(), 60000), WAIT_OBJECT_0);
-
   // What each operation answered decides what this process expects to find at the end.
   std::map<std::wstring, int> expected;  // name: port
   for (int k = 0; k < kLevelsEach; ++k) {
@@ -68,7 +60,6 @@ TEST(StoreProcesses, Child) {
   // delete then answers "not found" and is simply not done.
   RegWriteDword(HKEY_CURRENT_USER, kResults, (L"kept " + std::to_wstring(me)).c_str(), DWORD(expected.size()));
   ReleaseSemaphore(done.Get(), 1, nullptr);
-
   ASSERT_EQ(WaitForSingleObject(check.Get(), 60000), WAIT_OBJECT_0);
   for (const auto& [name, port] : expected) {
     CStationRecord found = Level(name, -1);
@@ -82,7 +73,6 @@ TEST(StoreProcesses, Child) {
   }
   std::printf("[ child    ] %d: %zu levels of its own\n", me, expected.size());
 }
-
 // Every key's Name, in enumeration order.
 std::vector<std::wstring> StoredNames() {
   std::vector<std::wstring> names;
@@ -101,7 +91,6 @@ std::vector<std::wstring> StoredNames() {
   }
   return names;
 }
-
 TEST(StoreProcesses, TwentyAtOnce) {
   if (!Variable(kChildVariable).empty()) GTEST_SKIP();
   RegistrySandbox sandbox;
@@ -129,7 +118,6 @@ TEST(StoreProcesses, TwentyAtOnce) {
   while (finished < kProcesses && WaitForSingleObject(done.Get(), 120000) == WAIT_OBJECT_0) ++finished;
   const ULONGLONG busy = GetTickCount64() - start;
   EXPECT_EQ(finished, kProcesses);
-
   // One name per key: no add lost a level to another, and none is left half written.
   std::map<std::wstring, int> count;
   for (const std::wstring& name : StoredNames()) ++count[name];
@@ -140,7 +128,6 @@ TEST(StoreProcesses, TwentyAtOnce) {
   for (int i = 0; i < kProcesses; ++i) kept += RegReadDword(HKEY_CURRENT_USER, kResults, (L"kept " + std::to_wstring(i)).c_str(), 0);
   EXPECT_EQ(count.size(), kept) << "levels lost or left over";
   EXPECT_GE(sharedAdds, 1);
-
   SetEvent(check.Get());
   EXPECT_EQ(WaitForMultipleObjects(kProcesses, children.data(), TRUE, 120000), WAIT_OBJECT_0);
   for (HANDLE child : children) {

@@ -9,7 +9,6 @@
 #include "store/string_table.h"
 #include "support/registry_sandbox.h"
 #include <sddl.h>  // after <windows.h>
-
 namespace {
 using List = win::UniqueCoMem<ITEMIDLIST>;
 const HKEY kUser = HKEY_CURRENT_USER;
@@ -71,9 +70,7 @@ TEST_F(Store, PathsParsingNameAndValidity) {
   EXPECT_TRUE(m.IsValid(level.Get()));
   EXPECT_FALSE(m.IsValid(other.Get()));
 }
-TEST_F(Store, DefaultsAndAStoreThatCannotBeReached) {
-  EXPECT_TRUE(Fields(CStationRecord()) ==
-              std::make_tuple(std::wstring(), 1, 9600, 1, 0, 8, 0, 1, std::wstring(), std::wstring(L"HRA20")));
+TEST_F(Store, AStoreThatCannotBeReached) {
   CStationRecord r = Full(L"A", 0);
   EXPECT_EQ(FindStation(r), E_FAIL);
   EXPECT_TRUE(RegKeyExists(kUser, kLevels)) << "even a find makes the keys";
@@ -105,7 +102,6 @@ TEST_F(Store, AddGivesUpOnAFailureOtherThanAnExistingKey) {
   EXPECT_TRUE(ended) << "AddStation went on trying";
   EXPECT_EQ(added, E_FAIL);
 }
-
 TEST_F(Store, AddWritesEveryValueAndFindReadsThemBack) {
   CStationRecord added = Full(L"Level one", 10);
   ASSERT_EQ(AddStation(added), S_OK);
@@ -253,22 +249,15 @@ TEST(PackedStations, DamagedBlocksYieldOnlyTheWholeRecordsBefore) {
   EXPECT_EQ(Unpacked(open).size(), 1u);
 }
 // Every text of the table, exactly: the English sentences are the keys of translations.
-const wchar_t kHra20[] =
-    L"1. Press the 'Menu' button\r\n"
-    L"2. Select the <JOB> setting mode and press the 'Enter' button\r\n"
-    L"3. Use down and left arrows to select <Output> and press the 'Enter' button\r\n"
-    L"4. Select the job you wish to send using the Down and Left arrows and press the 'Enter' button\r\n"
-    L"5. Use down and left arrows to select <TKF2x> format\r\n"
-    L"6. Click Start in the 'Download from Digital Level' dialog box\r\n"
-    L"7. Press 'Enter' on HRA20 and this will start the download";
-const wchar_t kHra40[] =
-    L"1. Press the 'Menu' button\r\n"
-    L"2. Select the <JOB> setting mode and press the 'Enter' button\r\n"
-    L"3. Use down and left arrows to select <Output> and press the 'Enter' button\r\n"
-    L"4. Select the job you wish to send using the Down and Left arrows and press the 'Enter' button\r\n"
-    L"5. Use down and left arrows to select <TKF2x> format\r\n"
-    L"6. Click Start in the 'Download from Digital Level' dialog box\r\n"
-    L"7. Press 'Enter' on HRA40 and this will start the download";
+#define HRA_STEPS \
+  L"1. Press the 'Menu' button\r\n" \
+  L"2. Select the <JOB> setting mode and press the 'Enter' button\r\n" \
+  L"3. Use down and left arrows to select <Output> and press the 'Enter' button\r\n" \
+  L"4. Select the job you wish to send using the Down and Left arrows and press the 'Enter' button\r\n" \
+  L"5. Use down and left arrows to select <TKF2x> format\r\n" \
+  L"6. Click Start in the 'Download from Digital Level' dialog box\r\n"
+const wchar_t kHra20[] = HRA_STEPS L"7. Press 'Enter' on HRA20 and this will start the download";
+const wchar_t kHra40[] = HRA_STEPS L"7. Press 'Enter' on HRA40 and this will start the download";
 const wchar_t kHrb1x[] =
     L"1. Press 'F2' for menu\r\n"
     L"2. Press '2' key for Management\r\n"

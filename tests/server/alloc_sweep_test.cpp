@@ -164,7 +164,9 @@ void FolderItemObjects() {
     com::ComPtr<IDataObject> data;
     if (object->QueryInterface(IID_IQueryInfo, info.PutVoid()) == S_OK) {
       LPWSTR tip = nullptr;
-      if (info->GetInfoTip(0, &tip) == S_OK) EXPECT_NE(tip[0], L'\0') << "a tip object without its item";
+      if (info->GetInfoTip(0, &tip) == S_OK) {
+        EXPECT_NE(tip[0], L'\0') << "a tip object without its item";
+      }
       CoTaskMemFree(tip);
     }
     if (object.As(&data) == S_OK) {

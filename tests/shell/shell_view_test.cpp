@@ -508,7 +508,10 @@ struct Resources {
     struct Entry { UINT64 object; USHORT pid, count, unique; BYTE type, flags; UINT64 user; };
     static_assert(sizeof(Entry) == 24);
     // PEB at TEB+0x60, its GdiSharedHandleTable at +0xF8 (64-bit layouts).
+#pragma GCC diagnostic push
+#pragma GCC diagnostic ignored "-Warray-bounds"  // the header reads gs:0x30 as if it were memory at 0x30
     BYTE* peb = *reinterpret_cast<BYTE**>(reinterpret_cast<BYTE*>(NtCurrentTeb()) + 0x60);
+#pragma GCC diagnostic pop
     auto* table = *reinterpret_cast<Entry**>(peb + 0xF8);
     if (!table) return GetGuiResources(GetCurrentProcess(), GR_GDIOBJECTS);
     long used = 0;

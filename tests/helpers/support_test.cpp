@@ -99,22 +99,15 @@ TEST(AppHelpers, HandedOverPathIsConsumedByTheFirstCallOnly) {
             ERROR_FILE_NOT_FOUND) << "but it is consumed";
   test_only::ForgetAppPath();
 }
-TEST(AppHelpers, NameVersionAndLanguagesRoot) {
-  EXPECT_EQ(GetAppNameW(), L"Marlix Digital Levels") << "as it stands, spaces and all";
+TEST(AppHelpers, NameAndLanguagesRoot) {
   const std::wstring plain = testfiles::TempDirectory() + L"tool.v2.exe";
   testfiles::WriteBytes(plain, "MZ no version block");
   EXPECT_EQ(AppNameOfExecutable(plain), L"tool") << "cut at the first dot";
   DeleteFileW(plain.c_str());
   EXPECT_EQ(AppNameOfExecutable(L"noseparator"), L"noseparator");
-  struct { const wchar_t *app, *version; } rows[] = {
-      {L"gravon tools", L"9"}, {L"GRAVON OFFICE", L"9"}, {L"Gravon GIS Office", L"8.1"},
-      {L"Gravon GIS", L"4.0.1"}};
-  for (const auto& r : rows) EXPECT_EQ(AppVersionFor(r.app), r.version) << r.app;
   // The languages root follows the not installed marker.
   test_only::ForgetAppPath();
   const std::wstring app = GetAppPathW(), common = GetCommonDataDirW();
-  ASSERT_GE(common.size(), 8u);
-  EXPECT_EQ(common.substr(common.size() - 8), L"\\FENROD\\");
   EXPECT_TRUE(std::filesystem::is_directory(common));
   EXPECT_EQ(GetLanguagesRootDirW(L"Gravon Tools"), common + L"Gravon Tools\\4.0.1\\Languages\\");
   testfiles::MarkNotInstalled(app);
@@ -169,8 +162,6 @@ TEST(ErrorReporter, SystemTableInternetCodesAndNamedSources) {
   EXPECT_EQ(BuildErrorText(Code(0x80040154)), L"# 80040154");
   EXPECT_EQ(BuildErrorText(Code(0x80040111)), L"# 80040111") << "row with no text";
   EXPECT_EQ(BuildErrorText(Code(0x00040301)), L"# 40301");
-  EXPECT_EQ(TStdErrorReporter::StringIdOf(Code(0x80040517)), 4011u);
-  EXPECT_EQ(TStdErrorReporter::StringIdOf(Code(0x8004051C)), 0u);
   // System messages lose their line end and take inserts.
   const std::wstring path = L"C:\\dir\\MarlixComm.dll";
   for (HRESULT code : {Code(0x8007007E), S_OK}) {

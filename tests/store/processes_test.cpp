@@ -69,7 +69,9 @@ TEST(StoreProcesses, Child) {
   for (int k = 0; k < kLevelsEach; ++k) {
     const std::wstring name = LevelName(me, k, false);
     CStationRecord gone = Level(name, -1);
-    if (!expected.count(name)) EXPECT_EQ(FindStation(gone), E_FAIL) << testing::PrintToString(name);
+    if (!expected.count(name)) {
+      EXPECT_EQ(FindStation(gone), E_FAIL) << testing::PrintToString(name);
+    }
   }
   std::printf("[ child    ] %d: %zu levels of its own\n", me, expected.size());
 }

@@ -18,6 +18,11 @@ expect_line() {
   local what="$1" pattern="$2"; shift 2
   query "$@" | grep -qF -- "$pattern" || fail "$what: no line with '$pattern' in reg query $*"
 }
+# expect_whole_line <description> <line> <reg query args...>: no blank more or less
+expect_whole_line() {
+  local what="$1" line="$2"; shift 2
+  query "$@" | grep -qxF -- "$line" || fail "$what: no line '$line' in reg query $*"
+}
 expect_key() { "$run" reg query "$1" >/dev/null 2>&1 || fail "key $1 is missing"; }
 expect_no_key() { ! "$run" reg query "$1" >/dev/null 2>&1 || fail "key $1 is still there"; }
 regsvr() { "$run" regsvr32 /s "$@" "$dll" || fail "regsvr32 $* answered $?"; }
@@ -29,8 +34,9 @@ regsvr /u    # nothing registered: still S_OK
 expect_no_key "$folder"
 
 regsvr
-expect_line "server" "$dll" "$folder\\InprocServer32" /ve
-expect_line "icon" "$dll,0" "$folder\\DefaultIcon" /ve
+expect_whole_line "server" "    (Default)    REG_SZ    $dll" "$folder\\InprocServer32" /ve
+expect_whole_line "threading" "    ThreadingModel    REG_SZ    Apartment" "$folder\\InprocServer32" /v ThreadingModel
+expect_whole_line "icon" "    (Default)    REG_SZ    $dll,0" "$folder\\DefaultIcon" /ve
 expect_line "attributes" "Attributes    REG_BINARY    000000A0" "$folder\\ShellFolder" /v Attributes
 expect_line "namespace" "Marlix Digital Levels" "$namespace\\{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}" /ve
 expect_line "approved" "Marlix Digital Levels" "$approved" /v "{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}"

@@ -1,4 +1,4 @@
-// The library contract (table positions, the points block, the temporary target path, the
+// The library contract (the points block, the temporary target path, the
 // stand-in), the hidden window that carries changes to a view, and the download dialog driven
 // as a person would, from a second thread, against the stand-in library beside the test
 // program: its control file MarlixComm.txt and its call log.
@@ -47,45 +47,6 @@ std::vector<std::string> StandInLog() {
   return lines;
 }
 long long Count(const std::string& line) { return std::ranges::count(StandInLog(), line); }
-
-// A hand-made object with a 14-entry table, as the other compiler lays it out: each
-// entry records its position and first two arguments.
-struct FakeObject { void** table; int slot = -1; long long first = 0, second = 0; };
-template <int Slot>
-long long Entry(FakeObject* self, long long a, long long b) { *self = {self->table, Slot, a, b}; return 0; }
-
-TEST(CommInterface, CallsReachTheirTablePositions) {
-  void* table[14];
-  [&]<int... Slots>(std::integer_sequence<int, Slots...>) {
-    ((table[Slots] = reinterpret_cast<void*>(&Entry<Slots>)), ...);
-  }(std::make_integer_sequence<int, 14>());
-  FakeObject fake{table};
-  auto* comm = reinterpret_cast<IMarlixComm*>(&fake);
-  auto reached = [&](int slot, long long first) {  // 32 bits: the rest of an int's register is undefined
-    EXPECT_EQ(fake.slot, slot);
-    EXPECT_EQ(static_cast<int>(fake.first), static_cast<int>(first)) << "slot " << slot;
-  };
-  const char* path = "x";
-  comm->SetCommParameters(3, 19200, 2, 1, 1, 7, 0);
-  reached(2, 3);
-  comm->Initialize();
-  EXPECT_EQ(fake.slot, 3);
-  comm->ReceiveFile(20, true);
-  reached(4, 20);
-  EXPECT_EQ(static_cast<unsigned char>(fake.second), 1);
-  comm->SetPoints(nullptr);
-  reached(6, 0);
-  comm->TerminateConnection();
-  EXPECT_EQ(fake.slot, 8);
-  comm->SetFilePath(path);
-  reached(9, reinterpret_cast<long long>(path));
-  comm->SetTimeout(30);
-  reached(10, 30);
-  comm->SetCallback(&CommResultCallback);
-  reached(13, reinterpret_cast<long long>(&CommResultCallback));
-  comm->Destroy(1);
-  reached(0, 1);
-}
 
 // Read by byte offset, not through the struct the code writes with.
 TEST(CommInterface, PointsBlockPresetsBytes20And92OfEachRecord) {

@@ -84,7 +84,6 @@ TEST(CommInterface, CallbackPostsTheSignExtendedCodeToTheOpenDialogOnly) {
   DestroyWindow(target);
 }
 
-
 TEST(CommInterface, TargetPathIsAFreshTkfNameWithoutExtensionInTheTempFolder) {
   std::wstring first, second;
   ASSERT_EQ(MakeDownloadTargetPath(first), 0u);

@@ -72,20 +72,10 @@ class DropOnRootView : public testing::Test {
     before_ = sheet::StoredLevels();
     frame_ = CreateWindowExW(0, L"STATIC", nullptr, WS_POPUP | WS_VISIBLE, 0, 0, 400, 300, nullptr, nullptr, nullptr,
                              nullptr);
-    ASSERT_EQ(CoCreateInstance(CLSID_ExplorerBrowser, nullptr, CLSCTX_INPROC_SERVER, IID_IExplorerBrowser,
-                               browser_.PutVoid()), S_OK);
-    RECT rect{0, 0, 400, 300};
-    FOLDERSETTINGS settings{FVM_DETAILS, 0};
-    ASSERT_EQ(browser_->Initialize(frame_, &rect, &settings), S_OK);
-    UniqueList folder;
-    ASSERT_EQ(SHParseDisplayName(kFolderPath, nullptr, folder.Put(), 0, nullptr), S_OK);
-    ASSERT_EQ(browser_->BrowseToIDList(folder.Get(), SBSP_ABSOLUTE), S_OK);
-    com::ComPtr<IShellView> view;
-    HWND window = nullptr;
-    ASSERT_EQ(browser_->GetCurrentView(IID_IShellView, view.PutVoid()), S_OK);
-    ASSERT_EQ(view->GetWindow(&window), S_OK);
-    list_ = GetDlgItem(window, 2000);
-    ASSERT_TRUE(PumpUntil([&] { return ListView_GetItemCount(list_) == 3; }, 20000)) << "filled";
+    browser_ = BrowseToFolder(frame_, {0, 0, 400, 300});
+    ASSERT_TRUE(browser_);
+    list_ = CurrentList(browser_.Get());
+    ASSERT_EQ(ListView_GetItemCount(list_), 3);
     target_ = static_cast<IDropTarget*>(GetPropW(list_, L"OleDropTargetInterface"));
     ASSERT_TRUE(target_) << "the list is a registered target";
   }

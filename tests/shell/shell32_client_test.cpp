@@ -51,16 +51,6 @@ TEST(Shell32Client, ReachesTheFolderUnderMyComputerWalksItAndShowsItsItems) {
   EXPECT_STREQ(tipText.Get(), L"Marlix Digital Levels\\North Site");
 }
 
-// The list of the browser's current view, once its thread has filled it.
-HWND CurrentList(IExplorerBrowser* browser) {
-  com::ComPtr<IShellView> view;
-  HWND window = nullptr;
-  if (FAILED(browser->GetCurrentView(IID_IShellView, view.PutVoid())) || FAILED(view->GetWindow(&window))) return nullptr;
-  HWND list = GetDlgItem(window, 2000);
-  EXPECT_TRUE(PumpUntil([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); })) << "filled";
-  return list;
-}
-
 std::vector<std::wstring> Rows(HWND list) {
   std::vector<std::wstring> rows;
   for (int i = 0; i < ListView_GetItemCount(list); ++i) {
@@ -79,16 +69,8 @@ TEST(ExplorerBrowserClient, ShowsTheLevelsAndMovesIntoALevelWhenItIsActivated) {
   SeedLevel(1, L"North Site");
   HWND frame = CreateWindowExW(0, L"STATIC", nullptr, WS_OVERLAPPEDWINDOW, 0, 0, 640, 480, nullptr, nullptr,
                                nullptr, nullptr);
-  com::ComPtr<IExplorerBrowser> browser;
-  ASSERT_EQ(CoCreateInstance(CLSID_ExplorerBrowser, nullptr, CLSCTX_INPROC_SERVER, IID_IExplorerBrowser,
-                             browser.PutVoid()), S_OK);
-  RECT rect{0, 0, 600, 400};
-  FOLDERSETTINGS settings{FVM_DETAILS, 0};
-  ASSERT_EQ(browser->Initialize(frame, &rect, &settings), S_OK);
-  UniqueList folder;
-  ASSERT_EQ(SHParseDisplayName(kFolderPath, nullptr, folder.Put(), 0, nullptr), S_OK);
-  ASSERT_EQ(browser->BrowseToIDList(folder.Get(), SBSP_ABSOLUTE), S_OK);
-
+  com::ComPtr<IExplorerBrowser> browser = BrowseToFolder(frame, {0, 0, 600, 400});
+  ASSERT_TRUE(browser);
   HWND list = CurrentList(browser.Get());
   ASSERT_TRUE(list);
   EXPECT_EQ(Rows(list), (std::vector<std::wstring>{L"Add New Digital Level", L"North Site", L"South Site"}));

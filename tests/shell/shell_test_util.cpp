@@ -1,5 +1,6 @@
 #include "shell/shell_test_util.h"
 
+#include <commctrl.h>
 #include <gtest/gtest.h>
 
 #include "store/station_record.h"
@@ -54,6 +55,27 @@ bool PumpUntil(const std::function<bool()>& done, DWORD milliseconds) {
     for (MSG msg; PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE);) DispatchMessageW(&msg);
   }
   return true;
+}
+
+com::ComPtr<IExplorerBrowser> BrowseToFolder(HWND frame, RECT rect) {
+  com::ComPtr<IExplorerBrowser> browser;
+  FOLDERSETTINGS settings{FVM_DETAILS, 0};
+  UniqueList folder;
+  EXPECT_EQ(CoCreateInstance(CLSID_ExplorerBrowser, nullptr, CLSCTX_INPROC_SERVER, IID_IExplorerBrowser,
+                             browser.PutVoid()), S_OK);
+  EXPECT_EQ(SHParseDisplayName(kFolderPath, nullptr, folder.Put(), 0, nullptr), S_OK);
+  if (!browser || FAILED(browser->Initialize(frame, &rect, &settings)) ||
+      FAILED(browser->BrowseToIDList(folder.Get(), SBSP_ABSOLUTE)))
+    return nullptr;
+  return browser;
+}
+HWND CurrentList(IExplorerBrowser* browser) {
+  com::ComPtr<IShellView> view;
+  HWND window = nullptr;
+  if (FAILED(browser->GetCurrentView(IID_IShellView, view.PutVoid())) || FAILED(view->GetWindow(&window))) return nullptr;
+  HWND list = GetDlgItem(window, 2000);
+  EXPECT_TRUE(PumpUntil([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); })) << "filled";
+  return list;
 }
 
 void Mouse(DWORD flags, POINT at) {

@@ -25,5 +25,9 @@ com::ComPtr<IShellFolder> Bind(IShellFolder* parent, LPCITEMIDLIST item);
 std::wstring Name(IShellFolder* folder, LPCITEMIDLIST item, SHGDNF flags, HRESULT* hr = nullptr);
 // Dispatches this thread's messages until `done` holds or `milliseconds` pass.
 bool PumpUntil(const std::function<bool()>& done, DWORD milliseconds = 10000);
+// Wine's ExplorerBrowser in `frame`, in Details, moved to the registered folder; null on failure.
+com::ComPtr<IExplorerBrowser> BrowseToFolder(HWND frame, RECT rect);
+// The list of the browser's current view, once its thread has filled it.
+HWND CurrentList(IExplorerBrowser* browser);
 // Real mouse input at a screen point, as SendInput gives it.
 void Mouse(DWORD flags, POINT at);

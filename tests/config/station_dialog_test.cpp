@@ -96,7 +96,10 @@ TEST_F(StationSheet, RefusedNamesKeepTheSheetOpenAndTheStoreUntouched) {
     const std::wstring badChars = L"Digital Level's name can not contain folowing symbols:\n\t\t\\*/";
     const std::pair<std::wstring, std::wstring> cases[] = {
         {L"", L"Please enter valid device name!"},
-        {L"A/B", badChars}, {L"A\\B", badChars}, {L"A*B", badChars}, {L"A\"B", badChars},
+        {L"A/B", badChars},
+        {L"A\\B", badChars},
+        {L"A*B", badChars},
+        {L"A\"B", badChars},
         {L"Level", L"The digital level 'Level' already exists"},
         {name259, (L"The digital level '" + name259 + L"' already exists").substr(0, 259)}};
     for (const auto& [name, message] : cases) {

@@ -25,14 +25,22 @@ HRESULT Code(unsigned long value) { return static_cast<HRESULT>(value); }
 TEST(PathParts, NamePartsSplitsAndComponents) {
   // path, then its directory, name and title parts
   const wchar_t* rows[][4] = {
-      {L"c:\\a/b", L"c:\\a/", L"b", L"b"},         {L"c:/a\\b", L"c:/a\\", L"b", L"b"},
-      {L"c:\\a\\", L"c:\\a\\", L"", L"c:\\a\\"},    {L"c:\\x.y\\name", L"c:\\x.y\\", L"name", L"name"},
-      {L"a.b.c", L"", L"a.b.c", L"a.b"},         {L"file", L"", L"file", L"file"},  {nullptr, L"", L"", L""}};
+      {L"c:\\a/b", L"c:\\a/", L"b", L"b"},
+      {L"c:/a\\b", L"c:/a\\", L"b", L"b"},
+      {L"c:\\a\\", L"c:\\a\\", L"", L"c:\\a\\"},
+      {L"c:\\x.y\\name", L"c:\\x.y\\", L"name", L"name"},
+      {L"a.b.c", L"", L"a.b.c", L"a.b"},
+      {L"file", L"", L"file", L"file"},
+      {nullptr, L"", L"", L""}};
   for (const auto& r : rows) {
     const std::wstring parts[] = {GetDirectoryPart(r[0]), GetNamePart(r[0]), GetTitlePart(r[0])};
     for (int i = 0; i < 3; ++i) EXPECT_EQ(parts[i], r[i + 1]) << (r[0] ? r[0] : L"null") << " part " << i;
   }
-  const wchar_t* separated[][2] = {{L"", L""}, {nullptr, L""}, {L"c:\\a/", L"c:\\a/"}, {L"c:\\a", L"c:\\a\\"}};
+  const wchar_t* separated[][2] = {
+      {L"", L""},
+      {nullptr, L""},
+      {L"c:\\a/", L"c:\\a/"},
+      {L"c:\\a", L"c:\\a\\"}};
   for (const auto& r : separated) EXPECT_EQ(AddTrailingSeparator(r[0]), r[1]) << (r[0] ? r[0] : L"null");
   // Split into network|server|drive|directory|title|extension|all fields composed again
   const auto fields = [](const CPathParts& p) {
@@ -43,7 +51,9 @@ TEST(PathParts, NamePartsSplitsAndComponents) {
       {L"c:\\dir\\sub/name.tar.gz", L"0||c|\\dir\\sub|name.tar|.gz|c:\\dir\\sub\\name.tar.gz"},
       {L"c:\\a.b\\c", L"0||c|\\a.b|c||c:\\a.b\\c"},
       {L"\\\\server\\share\\dir\\f.txt", L"1|server|share|\\dir|f|.txt|\\\\server\\share\\dir\\f.txt"},
-      {L"c:\\f.txt", L"0||c||f|.txt|c:\\f.txt"},  {L"plain", L"0||||plain||plain"},  {nullptr, L"0||||||"}};
+      {L"c:\\f.txt", L"0||c||f|.txt|c:\\f.txt"},
+      {L"plain", L"0||||plain||plain"},
+      {nullptr, L"0||||||"}};
   for (const auto& r : splits) EXPECT_EQ(fields(CPathParts(r[0])), r[1]) << (r[0] ? r[0] : L"null");
   EXPECT_EQ(CPathParts(L"c:\\dir\\name.tar.gz").Compose(CPathParts::Title), L"name.tar");
   // Components: runs of delimiters count as one, and ranges past the end are empty.

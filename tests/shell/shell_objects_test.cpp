@@ -114,9 +114,12 @@ TEST_F(ShellFolder, PathsBindingAndAttributesOfTheFirstItemOnly) {
   UniqueList gone = MakeId(PIDL_LEVEL, L"Gone"), rootId = MakeId(PIDL_ROOT, L"Marlix Digital Levels");
   struct Row { std::vector<LPCITEMIDLIST> items; SFGAOF in, out; HRESULT hr; };
   Row rows[] = {
-      {{}, 0, 0xFFFFFFFF, S_OK}, {{alpha_.Get()}, 0, SFGAO_FOLDER | SFGAO_DROPTARGET, S_OK},
-      {{file_.Get()}, SFGAO_FOLDER, SFGAO_CANCOPY, S_OK}, {{rootId.Get()}, 0, 0, S_OK},
-      {{alpha_.Get(), file_.Get()}, 0, 0, S_OK}, {{gone.Get()}, 0, 0, E_FAIL},
+      {{}, 0, 0xFFFFFFFF, S_OK},
+      {{alpha_.Get()}, 0, SFGAO_FOLDER | SFGAO_DROPTARGET, S_OK},
+      {{file_.Get()}, SFGAO_FOLDER, SFGAO_CANCOPY, S_OK},
+      {{rootId.Get()}, 0, 0, S_OK},
+      {{alpha_.Get(), file_.Get()}, 0, 0, S_OK},
+      {{gone.Get()}, 0, 0, E_FAIL},
       {{alpha_.Get(), gone.Get()}, 0, SFGAO_FOLDER | SFGAO_DROPTARGET, S_OK}};
   for (Row& row : rows) {
     SFGAOF attributes = row.in;
@@ -131,7 +134,8 @@ TEST_F(ShellFolder, ParsesWithoutTheStoreNamesByFlagsAndOrders) {
   const Parse parses[] = {
       {root_.Get(), L"Nowhere", S_OK, {{PIDL_LEVEL, L"Nowhere"}}},
       {root_.Get(), L"A/file1.tkf", S_OK, {{PIDL_LEVEL, L"A"}, {PIDL_FILE, L"file1.tkf"}}},
-      {root_.Get(), L"A\\B\\C", E_INVALIDARG, {}}, {root_.Get(), L"", S_OK, {}},
+      {root_.Get(), L"A\\B\\C", E_INVALIDARG, {}},
+      {root_.Get(), L"", S_OK, {}},
       {level_.Get(), L"file1.tkf", S_OK, {{PIDL_FILE, L"file1.tkf"}}},
       {level_.Get(), L"x\\y", S_OK, {{PIDL_LEVEL, L"Alpha"}, {PIDL_FILE, L"x"}}},
       {level_.Get(), L"x\\y\\z", E_INVALIDARG, {}}};
@@ -147,10 +151,16 @@ TEST_F(ShellFolder, ParsesWithoutTheStoreNamesByFlagsAndOrders) {
   }
   struct Named { SHGDNF flags; HRESULT hr; std::wstring text; };
   const Named names[] = {
-      {SHGDN_NORMAL, S_OK, L"Alpha"}, {SHGDN_INFOLDER, S_OK, L"Alpha"}, {SHGDN_FORADDRESSBAR, S_OK, L"Alpha"},
-      {SHGDN_FORADDRESSBAR | SHGDN_INFOLDER, S_OK, L"Alpha"}, {SHGDN_FORPARSING, S_OK, kParsingRoot + L"\\Alpha"},
-      {SHGDN_FORPARSING | SHGDN_INFOLDER, S_OK, L"Alpha"}, {SHGDN_FORPARSING | 0x02, S_OK, L""},
-      {0x02, E_INVALIDARG, L""}, {SHGDN_FORADDRESSBAR | 0x02, E_INVALIDARG, L""}, {SHGDN_FOREDITING, E_INVALIDARG, L""},
+      {SHGDN_NORMAL, S_OK, L"Alpha"},
+      {SHGDN_INFOLDER, S_OK, L"Alpha"},
+      {SHGDN_FORADDRESSBAR, S_OK, L"Alpha"},
+      {SHGDN_FORADDRESSBAR | SHGDN_INFOLDER, S_OK, L"Alpha"},
+      {SHGDN_FORPARSING, S_OK, kParsingRoot + L"\\Alpha"},
+      {SHGDN_FORPARSING | SHGDN_INFOLDER, S_OK, L"Alpha"},
+      {SHGDN_FORPARSING | 0x02, S_OK, L""},
+      {0x02, E_INVALIDARG, L""},
+      {SHGDN_FORADDRESSBAR | 0x02, E_INVALIDARG, L""},
+      {SHGDN_FOREDITING, E_INVALIDARG, L""},
       {SHGDN_FORPARSING | SHGDN_FORADDRESSBAR, E_INVALIDARG, L""}};
   for (const Named& row : names) {
     HRESULT hr = E_FAIL;
@@ -269,8 +279,10 @@ TEST_F(Shell, ImageListsHoldThreePicturesAtBothSizesAndIconsComeFromThem) {
   // The index follows the last id; a relative list has no parent id.
   auto icon = com::Make<CMarlixDLExtractIcon>();
   struct Row { UniqueList list; int index; } rows[] = {
-      {MakeFull(L"Marlix Digital Levels\\Alpha"), 0}, {MakeFull(L"Marlix Digital Levels"), 1},
-      {MakeFull(L"Marlix Digital Levels\\Alpha\\file1.tkf"), 2}, {MakeId(PIDL_LEVEL, L"Beta"), 0}};
+      {MakeFull(L"Marlix Digital Levels\\Alpha"), 0},
+      {MakeFull(L"Marlix Digital Levels"), 1},
+      {MakeFull(L"Marlix Digital Levels\\Alpha\\file1.tkf"), 2},
+      {MakeId(PIDL_LEVEL, L"Beta"), 0}};
   for (Row& row : rows) {
     SCOPED_TRACE(testing::Message() << "row " << &row - rows);
     ASSERT_TRUE(icon->SetItem(row.list.Get()));

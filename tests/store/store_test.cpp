@@ -89,7 +89,8 @@ TEST_F(Store, AddWritesEveryValueAndFindReadsThemBack) {
   CStationRecord found = Named(L"Level one");
   std::wstring key(260, L'x');
   for (auto [given, text, back] : {std::tuple<DWORD, const wchar_t*, DWORD>{3, L"Staxxxxxxx", 4},
-                                   {0, L"Staxxxxxxx", 0}, {260, L"Station 0", 10}}) {
+                                   {0, L"Staxxxxxxx", 0},
+                                   {260, L"Station 0", 10}}) {
     DWORD length = given;
     ASSERT_EQ(FindStation(found, key.data(), &length), S_OK);
     EXPECT_EQ(std::make_pair(std::wstring(key.c_str()).substr(0, 10), length), std::make_pair(std::wstring(text), back))

@@ -134,8 +134,11 @@ TEST_F(DataObject, RequestsThatNeedNoTransfer) {
   EXPECT_EQ(records[0].Name, L"South");
 
   // Index out of range, the level item (no file), and North's file: FindStation's code.
-  for (auto [index, expected] : {std::pair<LONG, HRESULT>{-1, S_FALSE}, {2, S_FALSE}, {LONG(0x80000000), S_FALSE},
-                                 {1, S_FALSE}, {0, E_FAIL}}) {
+  for (auto [index, expected] : {std::pair<LONG, HRESULT>{-1, S_FALSE},
+                                 {2, S_FALSE},
+                                 {LONG(0x80000000), S_FALSE},
+                                 {1, S_FALSE},
+                                 {0, E_FAIL}}) {
     f = Request(L"FileContents", TYMED_ISTREAM, index);
     EXPECT_EQ(two->GetData(&f, &m_), expected) << "lindex " << index;
   }

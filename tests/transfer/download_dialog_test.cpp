@@ -270,9 +270,12 @@ TEST_F(DownloadDialogTest, FullDownloadShowsItsTextsRunsTheContractInOrderAndEnd
     EXPECT_EQ(Text(dialog), L"Download file from Digital Level");
     const std::pair<int, std::wstring> texts[] = {
         {IDC_TRANSFER_INSTRUCTIONS, LoadTranslatedString(IDS_INSTRUCTIONS_HRA20)},
-        {IDC_TRANSFER_STATUS, L"Waiting for start..."}, {IDC_TRANSFER_NAME, Level().Name},
-        {IDC_TRANSFER_STATUS_LABEL, L"Status:"}, {IDC_TRANSFER_NAME_LABEL, L"File name:"},
-        {IDC_TRANSFER_START, L"Start"}, {IDCANCEL, L"Cancel"}};
+        {IDC_TRANSFER_STATUS, L"Waiting for start..."},
+        {IDC_TRANSFER_NAME, Level().Name},
+        {IDC_TRANSFER_STATUS_LABEL, L"Status:"},
+        {IDC_TRANSFER_NAME_LABEL, L"File name:"},
+        {IDC_TRANSFER_START, L"Start"},
+        {IDCANCEL, L"Cancel"}};
     for (const auto& [id, text] : texts) EXPECT_EQ(Text(dialog, id), text) << "control " << id;
     ASSERT_TRUE(Start(dialog));
     EXPECT_FALSE(IsWindowEnabled(GetDlgItem(dialog, IDC_TRANSFER_START)));
@@ -402,7 +405,8 @@ int RunInCopy(const wchar_t* dll, const std::string& name) {
 
 TEST(DownloadDialogFreshProcess, CancelBeforeStartMissingLibraryAndMissingExport) {
   const std::pair<const wchar_t*, const char*> runs[] = {
-      {L"MarlixComm.dll", "CancelBeforeStartNeverLoadsTheLibrary"}, {L"", "MissingLibraryIsReportedWithItsPath"},
+      {L"MarlixComm.dll", "CancelBeforeStartNeverLoadsTheLibrary"},
+      {L"", "MissingLibraryIsReportedWithItsPath"},
       {L"MarlixCommNoExport.dll", "LibraryWithoutCreateInstanceIsReportedWithoutPath"}};
   for (const auto& [dll, name] : runs) EXPECT_EQ(RunInCopy(dll, name), 0) << name;
 }

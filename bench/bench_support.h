@@ -1,36 +1,42 @@
 // What the benchmarks share: a scratch store, the bare registry walk they are measured
-// against, and the browser the view benchmarks host their views in.
+// against, the browser the view benchmarks host their views in, and a first-paint clock.
 #pragma once
 #include <windows.h>
 #include <shlobj.h>
 
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
 #include <string>
+#include <vector>
 
 #include "server/com_base.h"
 #include "store/station_record.h"
 
 namespace bench {
 
-// A scratch copy of HKEY_CURRENT_USER for the life of the object, removed afterwards.
+// A scratch copy of HKEY_CURRENT_USER for the life of the object, removed afterwards. Without
+// one the benchmark would measure the user's own levels, so it ends there.
 class ScratchStore {
  public:
   explicit ScratchStore(const wchar_t* name)
       : path_(std::wstring(L"Software\\") + name + std::to_wstring(GetCurrentProcessId())) {
-    if (RegCreateKeyExW(HKEY_CURRENT_USER, path_.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &key_, nullptr) ==
-        ERROR_SUCCESS)
-      ready_ = RegOverridePredefKey(HKEY_CURRENT_USER, key_) == ERROR_SUCCESS;
+    if (RegCreateKeyExW(HKEY_CURRENT_USER, path_.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &key_, nullptr) !=
+            ERROR_SUCCESS ||
+        RegOverridePredefKey(HKEY_CURRENT_USER, key_) != ERROR_SUCCESS) {
+      std::fprintf(stderr, "no scratch key\n");
+      std::exit(1);
+    }
   }
   ~ScratchStore() {
     RegOverridePredefKey(HKEY_CURRENT_USER, nullptr);
     if (key_) RegCloseKey(key_);
     RegDeleteTreeW(HKEY_CURRENT_USER, path_.c_str());
   }
-  bool Ready() const { return ready_; }
 
  private:
   std::wstring path_;
   HKEY key_ = nullptr;
-  bool ready_ = false;
 };
 
 // The levels' names read straight from the registry: what enumeration costs at the least.
@@ -53,7 +59,6 @@ inline size_t BareWalk() {
   RegCloseKey(levels);
   return count;
 }
-
 
 // The least a browser must do for a view: give it a window.
 class Browser : public com::ComObject<IShellBrowser> {
@@ -80,5 +85,41 @@ class Browser : public com::ComObject<IShellBrowser> {
  private:
   HWND frame_;
 };
+
+// The median time from the start of `run` to the first WM_PAINT its modal loop takes from the
+// queue; the window is cancelled right after that paint, so `run` returns.
+namespace first_paint {
+inline LARGE_INTEGER started;
+inline double ms = -1;
+inline HHOOK hook = nullptr;
+
+inline LRESULT CALLBACK OnGetMessage(int code, WPARAM wParam, LPARAM lParam) {
+  auto* message = reinterpret_cast<MSG*>(lParam);
+  if (code == HC_ACTION && wParam == PM_REMOVE && message->message == WM_PAINT && ms < 0) {
+    LARGE_INTEGER now, frequency;
+    QueryPerformanceCounter(&now);
+    QueryPerformanceFrequency(&frequency);
+    ms = 1000.0 * static_cast<double>(now.QuadPart - started.QuadPart) / static_cast<double>(frequency.QuadPart);
+    PostMessageW(GetAncestor(message->hwnd, GA_ROOT), WM_COMMAND, IDCANCEL, 0);
+  }
+  return CallNextHookEx(hook, code, wParam, lParam);
+}
+}  // namespace first_paint
+
+template <class Run>
+double MedianFirstPaint(int rounds, Run run) {
+  first_paint::hook = SetWindowsHookExW(WH_GETMESSAGE, first_paint::OnGetMessage, nullptr, GetCurrentThreadId());
+  std::vector<double> times;
+  for (int i = 0; i < rounds; ++i) {
+    first_paint::ms = -1;
+    QueryPerformanceCounter(&first_paint::started);
+    run();
+    if (first_paint::ms >= 0) times.push_back(first_paint::ms);
+  }
+  UnhookWindowsHookEx(first_paint::hook);
+  if (times.empty()) return -1;
+  std::sort(times.begin(), times.end());
+  return times[times.size() / 2];
+}
 
 }  // namespace bench

@@ -5,37 +5,15 @@
 #include <commctrl.h>
 #include <ole2.h>
 
-#include <algorithm>
 #include <cstdio>
 #include <string>
-#include <vector>
 
 #include "base/module_instance.h"
 #include "base/resource_ids.h"
+#include "bench/bench_support.h"
 #include "config/station_dialog.h"
 
 namespace {
-
-LARGE_INTEGER started;
-double firstPaintMs = -1;
-HHOOK hook = nullptr;
-
-double MsSince(const LARGE_INTEGER& from) {
-  LARGE_INTEGER now, frequency;
-  QueryPerformanceCounter(&now);
-  QueryPerformanceFrequency(&frequency);
-  return 1000.0 * static_cast<double>(now.QuadPart - from.QuadPart) / static_cast<double>(frequency.QuadPart);
-}
-
-// Sees WM_PAINT as the modal loop takes it from the queue; cancels the sheet after it.
-LRESULT CALLBACK OnGetMessage(int code, WPARAM wParam, LPARAM lParam) {
-  auto* message = reinterpret_cast<MSG*>(lParam);
-  if (code == HC_ACTION && wParam == PM_REMOVE && message->message == WM_PAINT && firstPaintMs < 0) {
-    firstPaintMs = MsSince(started);
-    PostMessageW(GetAncestor(message->hwnd, GA_ROOT), WM_COMMAND, IDCANCEL, 0);
-  }
-  return CallNextHookEx(hook, code, wParam, lParam);
-}
 
 INT_PTR CALLBACK BarePageProc(HWND, UINT message, WPARAM, LPARAM) { return message == WM_INITDIALOG; }
 
@@ -55,20 +33,6 @@ void BareSheet() {
   header.nPages = 2;
   header.ppsp = pages;
   PropertySheetW(&header);
-}
-
-template <class Run>
-double MedianFirstPaint(int rounds, Run run) {
-  std::vector<double> times;
-  for (int i = 0; i < rounds; ++i) {
-    firstPaintMs = -1;
-    QueryPerformanceCounter(&started);
-    run();
-    if (firstPaintMs >= 0) times.push_back(firstPaintMs);
-  }
-  if (times.empty()) return -1;
-  std::sort(times.begin(), times.end());
-  return times[times.size() / 2];
 }
 
 HKEY Scratch(const std::wstring& path) {
@@ -110,17 +74,15 @@ int main() {
   RegOverridePredefKey(HKEY_CURRENT_USER, user);
   FillStore();
 
-  hook = SetWindowsHookExW(WH_GETMESSAGE, OnGetMessage, nullptr, GetCurrentThreadId());
   const int rounds = 9;
   CStationRecord level;
   level.Name = L"Level 9999";
   FindStation(level);
-  double bare = MedianFirstPaint(rounds, [] { BareSheet(); });
-  double full = MedianFirstPaint(rounds, [&] {
+  double bare = bench::MedianFirstPaint(rounds, [] { BareSheet(); });
+  double full = bench::MedianFirstPaint(rounds, [&] {
     CStationDialog dialog(nullptr, level, false);
     dialog.DoModal();
   });
-  UnhookWindowsHookEx(hook);
 
   RegOverridePredefKey(HKEY_CURRENT_USER, nullptr);
   RegOverridePredefKey(HKEY_LOCAL_MACHINE, nullptr);

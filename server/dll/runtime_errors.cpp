@@ -3,6 +3,8 @@
 // string implementations with it: a tenth of the module, for a text no host ever reads.
 // Every entry from a host catches whatever is thrown (base/boundary.h) and tells only
 // "out of memory" from anything else, so these keep that distinction and no more.
+// A container call that needs a hook not defined here pulls the runtime's file of them all,
+// and the link fails on the duplicates: define the new one here too.
 #include <exception>
 #include <new>
 

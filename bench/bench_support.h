@@ -60,6 +60,23 @@ inline size_t BareWalk() {
   return count;
 }
 
+// Writes levels "Level 0" .. "Level <count-1>" key by key, with a name only: AddStation
+// would search the growing store each time.
+inline void SeedLevels(int count) {
+  HKEY levels = nullptr;
+  RegCreateKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &levels,
+                  nullptr);
+  for (int i = 0; i < count; ++i) {
+    std::wstring key = L"Station " + std::to_wstring(i), name = L"Level " + std::to_wstring(i);
+    HKEY level = nullptr;
+    RegCreateKeyExW(levels, key.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &level, nullptr);
+    RegSetValueExW(level, L"Name", 0, REG_SZ, reinterpret_cast<const BYTE*>(name.c_str()),
+                   static_cast<DWORD>((name.size() + 1) * sizeof(wchar_t)));
+    RegCloseKey(level);
+  }
+  RegCloseKey(levels);
+}
+
 // The least a browser must do for a view: give it a window.
 class Browser : public com::ComObject<IShellBrowser> {
  public:

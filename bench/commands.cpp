@@ -33,18 +33,7 @@ CStationRecord Level(const std::wstring& name) {
 
 void Reset(int count) {
   RegDeleteTreeW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str());
-  HKEY levels = nullptr;
-  RegCreateKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &levels,
-                  nullptr);
-  for (int i = 0; i < count; ++i) {
-    std::wstring key = L"Station " + std::to_wstring(i), name = L"Level " + std::to_wstring(i);
-    HKEY level = nullptr;
-    RegCreateKeyExW(levels, key.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &level, nullptr);
-    RegSetValueExW(level, L"Name", 0, REG_SZ, reinterpret_cast<const BYTE*>(name.c_str()),
-                   static_cast<DWORD>((name.size() + 1) * sizeof(wchar_t)));
-    RegCloseKey(level);
-  }
-  RegCloseKey(levels);
+  bench::SeedLevels(count);
 }
 
 void Pump(const std::function<bool()>& done) {

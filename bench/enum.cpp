@@ -18,22 +18,6 @@ namespace {
 
 using Clock = std::chrono::steady_clock;
 
-void Seed(int count) {
-  HKEY levels = nullptr;
-  RegCreateKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &levels,
-                  nullptr);
-  for (int i = 0; i < count; ++i) {
-    std::wstring key = L"Station " + std::to_wstring(i);
-    std::wstring name = L"Level " + std::to_wstring(i);
-    HKEY level = nullptr;
-    RegCreateKeyExW(levels, key.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &level, nullptr);
-    RegSetValueExW(level, L"Name", 0, REG_SZ, reinterpret_cast<const BYTE*>(name.c_str()),
-                   static_cast<DWORD>((name.size() + 1) * sizeof(wchar_t)));
-    RegCloseKey(level);
-  }
-  RegCloseKey(levels);
-}
-
 size_t FolderWalk(IShellFolder* folder) {
   IEnumIDList* list = nullptr;
   if (folder->EnumObjects(nullptr, SHCONTF_FOLDERS | SHCONTF_NONFOLDERS, &list) != S_OK) return 0;
@@ -79,7 +63,7 @@ int main() {
     auto folder = com::Make<CMarlixDLShellFolder>();
     folder->Initialize(nullptr);
     for (auto [levels, rounds] : {std::pair{10, 2001}, std::pair{10000, 7}}) {
-      Seed(levels);  // the first keys are rewritten, the rest added
+      bench::SeedLevels(levels);  // the first keys are rewritten, the rest added
       Measure(folder.Get(), levels, rounds);
     }
   }

@@ -23,21 +23,6 @@ using Clock = std::chrono::steady_clock;
 
 using bench::Browser;
 
-void Seed(int count) {
-  HKEY levels = nullptr;
-  RegCreateKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &levels,
-                  nullptr);
-  for (int i = 0; i < count; ++i) {
-    std::wstring key = L"Station " + std::to_wstring(i), name = L"Level " + std::to_wstring(i);
-    HKEY level = nullptr;
-    RegCreateKeyExW(levels, key.c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &level, nullptr);
-    RegSetValueExW(level, L"Name", 0, REG_SZ, reinterpret_cast<const BYTE*>(name.c_str()),
-                   static_cast<DWORD>((name.size() + 1) * sizeof(wchar_t)));
-    RegCloseKey(level);
-  }
-  RegCloseKey(levels);
-}
-
 
 double Since(Clock::time_point start) { return std::chrono::duration<double>(Clock::now() - start).count(); }
 
@@ -94,7 +79,7 @@ int main() {
     folder->Initialize(nullptr);
     Times small{}, large{};
     for (auto [levels, rounds, out] : {std::tuple{10, 201, &small}, std::tuple{10000, 7, &large}}) {
-      Seed(levels);  // the first keys are rewritten, the rest added
+      bench::SeedLevels(levels);  // the first keys are rewritten, the rest added
       *out = Measure(folder.Get(), browser.Get(), rounds);
       std::printf("%6d levels: CreateViewWindow %8.3f ms, filled list %9.3f ms, bare registry %9.3f ms, "
                   "filled/bare %6.2f (rows %zu)\n",

@@ -230,6 +230,10 @@ void CMarlixDLShellView::ApplyShellSettings() {
 // One thread at a time: a Refresh while one runs leaves that thread to fill the list.
 void CMarlixDLShellView::StartEnumeration() {
   if (EnumThreadMarker != -1 || !ShellFolder || !IsWindow(ViewWindow)) return;
+  ReleaseEnumJob();
+  // Made before the clip: with no job there is no thread to stop the clip again.
+  auto* job = new (std::nothrow) EnumJob;
+  if (!job) return;
   if (IsWindow(AnimateWindow)) DestroyWindow(AnimateWindow);
   AnimateWindow = CreateWindowExW(0, ANIMATE_CLASSW, nullptr, kAnimateStyle, 0, 0, 0, 0, ListWindow,
                                   reinterpret_cast<HMENU>(static_cast<INT_PTR>(kAnimateWindowId)), ModuleInstance(),
@@ -237,10 +241,6 @@ void CMarlixDLShellView::StartEnumeration() {
   if (AnimateWindow)
     SendMessageW(AnimateWindow, ACM_OPENW, reinterpret_cast<WPARAM>(ModuleInstance()),
                  reinterpret_cast<LPARAM>(MAKEINTRESOURCEW(IDR_ENUM_CLIP)));
-
-  ReleaseEnumJob();
-  auto* job = new (std::nothrow) EnumJob;
-  if (!job) return;
   job->ViewWindow = ViewWindow;
   job->Folder = ShellFolder.Get();
   job->Folder->AddRef();

@@ -2,6 +2,8 @@
 // the call (operator new or the task allocator) fails; no exception may come out, no
 // block may stay behind, and the module must be free to unload afterwards.
 #include <gtest/gtest.h>
+#include <windows.h>
+#include <commctrl.h>
 #include <objidl.h>
 #include <shlobj.h>
 #include <atomic>
@@ -23,9 +25,10 @@ namespace {
 std::atomic<long> liveBlocks{0};  // operator new blocks not yet deleted
 std::atomic<long> liveTaskBlocks{0};  // task allocator blocks made while the spy was in
 DWORD armedThread = 0;
-long allocations = 0;  // counted on the armed thread
-long failAt = 0;       // 0: none fails
-bool failed = false;
+bool everyThread = false;  // counts other threads too while armed: the view's worker
+std::atomic<long> allocations{0};  // counted on the armed thread
+long failAt = 0;                   // 0: none fails
+std::atomic<bool> failed{false};
 // The row's own inputs are made with counting paused: only the module's calls are swept.
 struct Paused {
   Paused() : thread(std::exchange(armedThread, 0)) {}
@@ -33,7 +36,7 @@ struct Paused {
   DWORD thread;
 };
 bool ShouldFail() noexcept {
-  if (!armedThread || GetCurrentThreadId() != armedThread) return false;
+  if (!armedThread || (!everyThread && GetCurrentThreadId() != armedThread)) return false;
   if (++allocations != failAt) return false;
   failed = true;
   return true;
@@ -232,19 +235,30 @@ class Browser : public com::ComObject<IShellBrowser> {
   STDMETHODIMP OnViewWindowActive(IShellView*) override { return S_OK; }
   STDMETHODIMP SetToolbarItems(LPTBBUTTONSB, UINT, UINT) override { return S_OK; }
 };
-void ViewCreation() {
+// The view opened in a browser; with `fill`, also its worker's enumerator and the rows made
+// from it, after which the clip must have stopped whatever failed.
+void View(bool fill) {
   com::ComPtr<Browser> browser = Unswept([] { return com::Make<Browser>(); });
+  everyThread = fill;
   if (auto root = Root()) {
     IShellView* view = nullptr;
     if (root->CreateViewObject(nullptr, IID_IShellView, reinterpret_cast<void**>(&view)) == S_OK) {
       FOLDERSETTINGS settings{FVM_DETAILS, 0};
       RECT box{0, 0, 300, 200};
       HWND window = nullptr;
-      if (view->CreateViewWindow(nullptr, &settings, browser.Get(), &box, &window) == S_OK) view->DestroyViewWindow();
+      if (view->CreateViewWindow(nullptr, &settings, browser.Get(), &box, &window) == S_OK) {
+        HWND list = FindWindowExW(window, nullptr, WC_LISTVIEWW, nullptr);
+        if (fill) {
+          EXPECT_TRUE(PumpUntil([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); }, 5000))
+              << "the clip still plays";
+        }
+        view->DestroyViewWindow();
+      }
       view->Release();
     }
   }
   Paused paused;
+  everyThread = false;
   browser.Reset();
   // Messages go on being handled until the view's worker has let go of the module.
   PumpUntil([] { return com::ModuleLockCount() == 0; }, 5000);
@@ -263,7 +277,8 @@ const Row kRows[] = {
     {"folder: item objects, tip and menu", FolderItemObjects},
     {"data object: every format and the format list", DataObjectFormats},
     {"registration and unregistration", Registration},
-    {"the view's creation, in a browser", ViewCreation},
+    {"the view's creation, in a browser", [] { View(false); }},
+    {"the view's fill, on its worker thread and the window's", [] { View(true); }},
 };
 class AllocationSweep : public testing::TestWithParam<Row> {
  protected:

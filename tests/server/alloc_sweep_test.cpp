@@ -18,6 +18,7 @@
 #include "server/object_map.h"
 #include "server/server_module.h"
 #include "shell/shell_test_util.h"
+#include "shell/shell_view.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
 #include "transfer/data_object.h"
@@ -235,9 +236,10 @@ class Browser : public com::ComObject<IShellBrowser> {
   STDMETHODIMP OnViewWindowActive(IShellView*) override { return S_OK; }
   STDMETHODIMP SetToolbarItems(LPTBBUTTONSB, UINT, UINT) override { return S_OK; }
 };
-// The view opened in a browser; with `fill`, also its worker's enumerator and the rows made
-// from it, after which the clip must have stopped whatever failed.
-void View(bool fill) {
+// The view opened in a browser. With `fill` also its worker's enumerator and the rows made
+// from it, after which the clip must have stopped whatever failed; with `use` then, once
+// filled, the menus of its activation, a copy of a level and a refill by the Details command.
+void View(bool fill, bool use = false) {
   com::ComPtr<Browser> browser = Unswept([] { return com::Make<Browser>(); });
   everyThread = fill;
   if (auto root = Root()) {
@@ -246,14 +248,29 @@ void View(bool fill) {
       FOLDERSETTINGS settings{FVM_DETAILS, 0};
       RECT box{0, 0, 300, 200};
       HWND window = nullptr;
+      const DWORD armed = std::exchange(armedThread, use ? 0 : armedThread);
       if (view->CreateViewWindow(nullptr, &settings, browser.Get(), &box, &window) == S_OK) {
         HWND list = FindWindowExW(window, nullptr, WC_LISTVIEWW, nullptr);
+        const auto filled = [&] { return PumpUntil([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); }, 5000); };
         if (fill) {
-          EXPECT_TRUE(PumpUntil([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); }, 5000))
-              << "the clip still plays";
+          EXPECT_TRUE(filled()) << "the clip still plays";
+        }
+        if (use) {
+          LVITEMW selected{};
+          selected.stateMask = selected.state = LVIS_SELECTED;
+          SendMessageW(list, LVM_SETITEMSTATE, 1, reinterpret_cast<LPARAM>(&selected));
+          armedThread = armed;
+          view->UIActivate(SVUIA_ACTIVATE_FOCUS);
+          SendMessageW(window, WM_COMMAND, kCmdCopy, 0);
+          SendMessageW(window, WM_COMMAND, kCmdDetails, 0);
+          EXPECT_TRUE(filled()) << "the clip of the refill still plays";
+          Paused paused;
+          OleSetClipboard(nullptr);
+          view->UIActivate(SVUIA_DEACTIVATE);
         }
         view->DestroyViewWindow();
       }
+      armedThread = armed;
       view->Release();
     }
   }
@@ -279,6 +296,7 @@ const Row kRows[] = {
     {"registration and unregistration", Registration},
     {"the view's creation, in a browser", [] { View(false); }},
     {"the view's fill, on its worker thread and the window's", [] { View(true); }},
+    {"the view's menus, a copy and a refill", [] { View(true, true); }},
 };
 class AllocationSweep : public testing::TestWithParam<Row> {
  protected:

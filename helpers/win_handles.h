@@ -1,6 +1,6 @@
 // RAII owners for the system resources the module holds: registry keys, kernel
 // handles, global memory, GDI objects, icons, image lists, libraries, views and
-// memory from the COM task allocator (which is the shell's IMalloc).
+// memory from the COM task allocator (which is the shell's IMalloc), storage media.
 #pragma once
 #include <windows.h>
 #include <commctrl.h>
@@ -122,6 +122,27 @@ class UniqueCoMem {
 
  private:
   T* p_ = nullptr;
+};
+
+// A medium that IDataObject::GetData filled in: released once, whatever happens after.
+class UniqueMedium {
+ public:
+  UniqueMedium() noexcept = default;
+  UniqueMedium(const UniqueMedium&) = delete;
+  UniqueMedium& operator=(const UniqueMedium&) = delete;
+  ~UniqueMedium() { ReleaseStgMedium(&medium_); }  // an empty one (TYMED_NULL) holds nothing
+  void Reset() noexcept {
+    ReleaseStgMedium(&medium_);
+    medium_ = {};
+  }
+  STGMEDIUM* Put() noexcept {
+    Reset();
+    return &medium_;
+  }
+  const STGMEDIUM& Get() const noexcept { return medium_; }
+
+ private:
+  STGMEDIUM medium_{};
 };
 
 // Locks global memory for the life of the guard.

@@ -131,11 +131,12 @@ void CMarlixDLShellView::OnPaste() {
   if (FolderType() == PIDL_ROOT) {
     FORMATETC format{static_cast<CLIPFORMAT>(RegisterClipboardFormatW(kStationsFormat)), nullptr, DVASPECT_CONTENT,
                      -1, TYMED_HGLOBAL};
-    STGMEDIUM medium{};
-    if (clipboard->GetData(&format, &medium) == S_OK) {
+    win::UniqueMedium medium;
+    if (clipboard->GetData(&format, medium.Put()) == S_OK) {
+      // Unpacking can run out of memory; the medium is the clipboard's copy, ours to free.
       std::vector<CStationRecord> records;
-      if (medium.tymed == TYMED_HGLOBAL) UnpackStations(medium.hGlobal, records);
-      ReleaseStgMedium(&medium);
+      if (medium.Get().tymed == TYMED_HGLOBAL) UnpackStations(medium.Get().hGlobal, records);
+      medium.Reset();
       const std::wstring prefix = LoadTranslatedString(IDS_COPY_OF);
       for (CStationRecord& record : records) {
         std::wstring name = record.Name;

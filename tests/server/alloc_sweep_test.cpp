@@ -238,7 +238,8 @@ class Browser : public com::ComObject<IShellBrowser> {
 };
 // The view opened in a browser. With `fill` also its worker's enumerator and the rows made
 // from it, after which the clip must have stopped whatever failed; with `use` then, once
-// filled, the menus of its activation, a copy of a level and a refill by the Details command.
+// filled, the menus of its activation, a copy of a level, its paste and a refill by the Details
+// command.
 void View(bool fill, bool use = false) {
   com::ComPtr<Browser> browser = Unswept([] { return com::Make<Browser>(); });
   everyThread = fill;
@@ -262,10 +263,14 @@ void View(bool fill, bool use = false) {
           armedThread = armed;
           view->UIActivate(SVUIA_ACTIVATE_FOCUS);
           SendMessageW(window, WM_COMMAND, kCmdCopy, 0);
+          SendMessageW(window, WM_COMMAND, kCmdPaste, 0);
           SendMessageW(window, WM_COMMAND, kCmdDetails, 0);
           EXPECT_TRUE(filled()) << "the clip of the refill still plays";
           Paused paused;
           OleSetClipboard(nullptr);
+          CStationRecord copy;
+          copy.Name = L"Copy of Alpha level";
+          DeleteStation(copy);
           view->UIActivate(SVUIA_DEACTIVATE);
         }
         view->DestroyViewWindow();
@@ -296,7 +301,7 @@ const Row kRows[] = {
     {"registration and unregistration", Registration},
     {"the view's creation, in a browser", [] { View(false); }},
     {"the view's fill, on its worker thread and the window's", [] { View(true); }},
-    {"the view's menus, a copy and a refill", [] { View(true, true); }},
+    {"the view's menus, a copy, its paste and a refill", [] { View(true, true); }},
 };
 class AllocationSweep : public testing::TestWithParam<Row> {
  protected:

@@ -1,5 +1,7 @@
 // The view's entries in the browser's File, Edit and View menus, and its context menu.
 // States are worked out each time a menu is built, and menus are rebuilt each time one opens.
+#include <utility>
+
 #include "base/resource_ids.h"
 #include "shell/shell_view.h"
 #include "store/string_table.h"
@@ -42,22 +44,28 @@ HMENU SubMenu(HMENU menu, UINT id) {
 // Runs at activation, at each mode change and at every WM_INITMENUPOPUP.
 void CMarlixDLShellView::BuildMenus() {
   if (!ShellBrowser) return;
-  // The menu of the build before is the browser's no more once the new one is set; its
-  // own popups go back to it first.
-  HMENU previous = MergedMenu;
   HMENU menu = CreateMenu();
   if (!menu) return;
-  MergedMenu = menu;
   OLEMENUGROUPWIDTHS widths{};
   ShellBrowser->InsertMenusSB(menu, &widths);
-  if (HMENU file = SubMenu(menu, FCIDM_MENU_FILE)) FillFileMenu(file, true);
-  if (HMENU view = SubMenu(menu, FCIDM_MENU_VIEW)) FillViewMenu(view, true);
-  if (UIState == SVUIA_ACTIVATE_FOCUS) {
-    if (HMENU edit = SubMenu(menu, FCIDM_MENU_EDIT)) {
-      for (int i = GetMenuItemCount(edit) - 1; i >= 0; --i) DeleteMenu(edit, i, MF_BYPOSITION);
-      FillEditMenu(edit, true);
+  try {
+    if (HMENU file = SubMenu(menu, FCIDM_MENU_FILE)) FillFileMenu(file, true);
+    if (HMENU view = SubMenu(menu, FCIDM_MENU_VIEW)) FillViewMenu(view, true);
+    if (UIState == SVUIA_ACTIVATE_FOCUS) {
+      if (HMENU edit = SubMenu(menu, FCIDM_MENU_EDIT)) {
+        for (int i = GetMenuItemCount(edit) - 1; i >= 0; --i) DeleteMenu(edit, i, MF_BYPOSITION);
+        FillEditMenu(edit, true);
+      }
     }
+  } catch (...) {
+    // Out of memory half way: the browser keeps the menu it shows, and gets this one back.
+    ShellBrowser->RemoveMenusSB(menu);
+    DestroyMenu(menu);
+    throw;
   }
+  // The menu of the build before is the browser's no more once the new one is set; its
+  // own popups go back to it first.
+  HMENU previous = std::exchange(MergedMenu, menu);
   ShellBrowser->SetMenuSB(menu, nullptr, ViewWindow);
   if (previous && previous != menu) {
     ShellBrowser->RemoveMenusSB(previous);

@@ -219,9 +219,20 @@ class Browser : public com::ComObject<IShellBrowser> {
   HWND frame;
   STDMETHODIMP GetWindow(HWND* window) override { return *window = frame, S_OK; }
   STDMETHODIMP ContextSensitiveHelp(BOOL) override { return E_NOTIMPL; }
-  STDMETHODIMP InsertMenusSB(HMENU, LPOLEMENUGROUPWIDTHS) override { return S_OK; }
+  int lent = 0;  // menus filled with this browser's popups and not given back
+  // As Explorer does: File, Edit and View popups for the view to add its entries to.
+  STDMETHODIMP InsertMenusSB(HMENU menu, LPOLEMENUGROUPWIDTHS) override {
+    ++lent;
+    for (UINT id : {FCIDM_MENU_FILE, FCIDM_MENU_EDIT, FCIDM_MENU_VIEW}) {
+      MENUITEMINFOW item{sizeof(item), MIIM_ID | MIIM_SUBMENU};
+      item.wID = id;
+      item.hSubMenu = CreatePopupMenu();
+      InsertMenuItemW(menu, GetMenuItemCount(menu), TRUE, &item);
+    }
+    return S_OK;
+  }
   STDMETHODIMP SetMenuSB(HMENU, HOLEMENU, HWND) override { return S_OK; }
-  STDMETHODIMP RemoveMenusSB(HMENU) override { return S_OK; }
+  STDMETHODIMP RemoveMenusSB(HMENU) override { return --lent, S_OK; }
   STDMETHODIMP SetStatusTextSB(LPCWSTR) override { return S_OK; }
   STDMETHODIMP EnableModelessSB(BOOL) override { return S_OK; }
   STDMETHODIMP TranslateAcceleratorSB(MSG*, WORD) override { return S_FALSE; }
@@ -272,6 +283,7 @@ void View(bool fill, bool use = false) {
           copy.Name = L"Copy of Alpha level";
           DeleteStation(copy);
           view->UIActivate(SVUIA_DEACTIVATE);
+          EXPECT_EQ(browser->lent, 0) << "a merged menu the browser filled was never given back";
         }
         view->DestroyViewWindow();
       }

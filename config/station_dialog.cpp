@@ -75,7 +75,7 @@ int PortNumberOf(const std::wstring& portText) {
 
 // General page
 
-CStationGeneralPage::CStationGeneralPage(int newLevel, CStationRecord* record) noexcept
+CStationGeneralPage::CStationGeneralPage(int newLevel, CStationRecord* record)
     : CPropertyPage(IDD_STATION_GENERAL), NewLevel(newLevel), Record(record) {
   for (int id : {IDC_STATION_NAME, IDC_STATION_NOTE}) MapNotification(id, EN_CHANGE, [this] { OnChange(); });
   for (int id : {IDC_STATION_PORT, IDC_STATION_MODEL}) MapNotification(id, CBN_SELCHANGE, [this] { OnChange(); });
@@ -130,7 +130,7 @@ void CStationGeneralPage::OnChange() {
 
 // Advanced page
 
-CStationAdvancedPage::CStationAdvancedPage(int newLevel, CStationRecord* record) noexcept
+CStationAdvancedPage::CStationAdvancedPage(int newLevel, CStationRecord* record)
     : CPropertyPage(IDD_STATION_ADVANCED), NewLevel(newLevel), Record(record) {
   for (int id : {IDC_STATION_BAUD, IDC_STATION_PARITY, IDC_STATION_DATABITS, IDC_STATION_STOPBITS, IDC_STATION_FLOW,
                  IDC_STATION_CHECKSUM})

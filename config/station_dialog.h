@@ -19,7 +19,7 @@ int PortNumberOf(const std::wstring& portText);
 
 class CStationGeneralPage : public CPropertyPage {
  public:
-  CStationGeneralPage(int newLevel, CStationRecord* record) noexcept;
+  CStationGeneralPage(int newLevel, CStationRecord* record);
 
   int NewLevel;
   CStationRecord* Record;  // not owned
@@ -42,7 +42,7 @@ class CStationGeneralPage : public CPropertyPage {
 
 class CStationAdvancedPage : public CPropertyPage {
  public:
-  CStationAdvancedPage(int newLevel, CStationRecord* record) noexcept;
+  CStationAdvancedPage(int newLevel, CStationRecord* record);
 
   int NewLevel;
   CStationRecord* Record;  // not owned

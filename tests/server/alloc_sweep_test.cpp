@@ -247,10 +247,26 @@ class Browser : public com::ComObject<IShellBrowser> {
   STDMETHODIMP OnViewWindowActive(IShellView*) override { return S_OK; }
   STDMETHODIMP SetToolbarItems(LPTBBUTTONSB, UINT, UINT) override { return S_OK; }
 };
+// A person dismissing every dialog of this process: Cancel on a sheet, Close on a message
+// box. A thread of the system's, so that it makes no allocation the sweep would count.
+std::atomic<bool> dismissing{false};
+DWORD WINAPI Dismiss(void*) {
+  DWORD process = 0;
+  while (dismissing) {
+    for (HWND dialog = nullptr; (dialog = FindWindowExW(nullptr, dialog, L"#32770", nullptr)) != nullptr;) {
+      if (!IsWindowVisible(dialog) || !GetWindowThreadProcessId(dialog, &process) || process != GetCurrentProcessId())
+        continue;
+      if (PropSheet_GetCurrentPageHwnd(dialog)) PostMessageW(dialog, WM_COMMAND, IDCANCEL, 0);
+      else PostMessageW(dialog, WM_CLOSE, 0, 0);
+    }
+    Sleep(10);
+  }
+  return 0;
+}
 // The view opened in a browser. With `fill` also its worker's enumerator and the rows made
 // from it, after which the clip must have stopped whatever failed; with `use` then, once
-// filled, the menus of its activation, a copy of a level, its paste and a refill by the Details
-// command.
+// filled, the menus of its activation, a copy of a level, its paste, a refill by the Details
+// command and the level's property sheet.
 void View(bool fill, bool use = false) {
   com::ComPtr<Browser> browser = Unswept([] { return com::Make<Browser>(); });
   everyThread = fill;
@@ -277,6 +293,16 @@ void View(bool fill, bool use = false) {
           SendMessageW(window, WM_COMMAND, kCmdPaste, 0);
           SendMessageW(window, WM_COMMAND, kCmdDetails, 0);
           EXPECT_TRUE(filled()) << "the clip of the refill still plays";
+          {
+            Paused paused;
+            SendMessageW(list, LVM_SETITEMSTATE, 1, reinterpret_cast<LPARAM>(&selected));
+            dismissing = true;
+          }
+          HANDLE person = CreateThread(nullptr, 0, Dismiss, nullptr, 0, nullptr);
+          SendMessageW(window, WM_COMMAND, kCmdProperties, 0);
+          dismissing = false;
+          WaitForSingleObject(person, INFINITE);
+          CloseHandle(person);
           Paused paused;
           OleSetClipboard(nullptr);
           CStationRecord copy;
@@ -313,7 +339,7 @@ const Row kRows[] = {
     {"registration and unregistration", Registration},
     {"the view's creation, in a browser", [] { View(false); }},
     {"the view's fill, on its worker thread and the window's", [] { View(true); }},
-    {"the view's menus, a copy, its paste and a refill", [] { View(true, true); }},
+    {"the view's menus, a copy, its paste, a refill and a sheet", [] { View(true, true); }},
 };
 class AllocationSweep : public testing::TestWithParam<Row> {
  protected:

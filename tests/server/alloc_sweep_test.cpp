@@ -263,6 +263,29 @@ DWORD WINAPI Dismiss(void*) {
   }
   return 0;
 }
+// Runs `action`, a modal one, while the person dismisses what it shows.
+template <class Action>
+void Dismissing(Action action) {
+  dismissing = true;
+  HANDLE person = CreateThread(nullptr, 0, Dismiss, nullptr, 0, nullptr);
+  action();
+  dismissing = false;
+  WaitForSingleObject(person, INFINITE);
+  CloseHandle(person);
+}
+// A file's contents: the download dialog comes up and is cancelled before Start.
+void DownloadCancelled() {
+  auto object = com::Make<CMarlixDLDataObject>();
+  if (!object) return;
+  UniqueList file = Unswept([] { return MakeFull(L"Marlix Digital Levels\\Alpha level\\file1.tkf"); });
+  object->AddItem(file.Get());
+  FORMATETC request = {static_cast<CLIPFORMAT>(RegisterClipboardFormatW(L"FileContents")), nullptr, DVASPECT_CONTENT,
+                       0, TYMED_ISTREAM};
+  STGMEDIUM medium{};
+  Dismissing([&] {
+    if (object->GetData(&request, &medium) == S_OK) ReleaseStgMedium(&medium);
+  });
+}
 // The view opened in a browser. With `fill` also its worker's enumerator and the rows made
 // from it, after which the clip must have stopped whatever failed; with `use` then, once
 // filled, the menus of its activation, a copy of a level, its paste, a refill by the Details
@@ -293,16 +316,8 @@ void View(bool fill, bool use = false) {
           SendMessageW(window, WM_COMMAND, kCmdPaste, 0);
           SendMessageW(window, WM_COMMAND, kCmdDetails, 0);
           EXPECT_TRUE(filled()) << "the clip of the refill still plays";
-          {
-            Paused paused;
-            SendMessageW(list, LVM_SETITEMSTATE, 1, reinterpret_cast<LPARAM>(&selected));
-            dismissing = true;
-          }
-          HANDLE person = CreateThread(nullptr, 0, Dismiss, nullptr, 0, nullptr);
-          SendMessageW(window, WM_COMMAND, kCmdProperties, 0);
-          dismissing = false;
-          WaitForSingleObject(person, INFINITE);
-          CloseHandle(person);
+          Unswept([&] { return SendMessageW(list, LVM_SETITEMSTATE, 1, reinterpret_cast<LPARAM>(&selected)); });
+          Dismissing([&] { SendMessageW(window, WM_COMMAND, kCmdProperties, 0); });
           Paused paused;
           OleSetClipboard(nullptr);
           CStationRecord copy;
@@ -336,6 +351,7 @@ const Row kRows[] = {
     {"folder: attributes, comparison and names", FolderAnswers},
     {"folder: item objects, tip and menu", FolderItemObjects},
     {"data object: every format and the format list", DataObjectFormats},
+    {"data object: a file's contents, its download dialog cancelled", DownloadCancelled},
     {"registration and unregistration", Registration},
     {"the view's creation, in a browser", [] { View(false); }},
     {"the view's fill, on its worker thread and the window's", [] { View(true); }},

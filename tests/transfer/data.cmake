@@ -23,3 +23,5 @@ marlix_copy_standin(data_clipboard_driver)
 add_dependencies(data_clipboard_driver shell_peer)
 add_test(NAME data_clipboard COMMAND ${MARLIX_WINE_RUN} $<TARGET_FILE:data_clipboard_driver> ${MARLIX_SHELL_PEER})
 marlix_wine_test(data_clipboard)
+# The system clipboard is one for all processes: tests that copy take turns.
+set_tests_properties(data_clipboard PROPERTIES RESOURCE_LOCK clipboard)

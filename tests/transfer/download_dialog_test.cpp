@@ -22,6 +22,10 @@
 #include "transfer/comm_interface.h"
 #include "transfer/download_dialog.h"
 
+// Rectangles compare and print as what they hold.
+static bool operator==(const RECT& a, const RECT& b) { return EqualRect(&a, &b); }
+static void PrintTo(const RECT& r, std::ostream* out) { *out << r.left << "," << r.top << "," << r.right << "," << r.bottom; }
+
 namespace {
 namespace fs = std::filesystem;
 
@@ -120,59 +124,54 @@ TEST(StandIn, EveryReceiveFileCallsBack) {
   DeleteFileA((std::string(target) + ".txt").c_str());
 }
 
-// The transfer dialog's template, read from the resource as the dialog manager reads it.
-TEST(DownloadTemplate, LayoutAndStyles) {
-  HRSRC found = FindResourceW(GetModuleHandleW(nullptr), MAKEINTRESOURCEW(213), RT_DIALOG);
-  ASSERT_TRUE(found);
-  const auto* dialog = static_cast<const DLGTEMPLATE*>(LockResource(LoadResource(GetModuleHandleW(nullptr), found)));
-  ASSERT_NE(dialog->style, 0xFFFF0001u) << "a plain template, not an extended one";
-  EXPECT_EQ(dialog->style, DWORD(WS_POPUP | WS_CAPTION | WS_SYSMENU | DS_MODALFRAME | DS_SETFONT | DS_SYSMODAL));
-  EXPECT_EQ(dialog->cx, 267);
-  EXPECT_EQ(dialog->cy, 178);
-  const WORD* at = reinterpret_cast<const WORD*>(dialog + 1);
-  WORD atom = 0;
-  auto text = [&] {  // a string, or 0xFFFF and an ordinal, which goes to `atom`
-    std::wstring read;
-    if (*at == 0xFFFF) {
-      atom = at[1];
-      at += 2;
-    } else {
-      read = reinterpret_cast<const wchar_t*>(at);
-      at += read.size() + 1;
-    }
-    return read;
+// A transfer dialog as the dialog manager makes it from the module's template. The upload
+// twin is the download's with the text box, and all below it, `up` dialog units higher.
+void CheckTransferDialog(WORD id, const std::wstring& caption, LONG up) {
+  SCOPED_TRACE(testing::Message() << "dialog " << id);
+  HWND dialog = CreateDialogParamW(GetModuleHandleW(nullptr), MAKEINTRESOURCEW(id), nullptr,
+                                   [](HWND, UINT, WPARAM, LPARAM) -> INT_PTR { return FALSE; }, 0);
+  ASSERT_TRUE(dialog);
+  const auto pixels = [&](RECT box) {  // x, y, width, height in dialog units, each mapped as the manager does
+    MapDialogRect(dialog, &box);
+    return RECT{box.left, box.top, box.left + box.right, box.top + box.bottom};
   };
-  text();  // menu
-  text();  // class
-  EXPECT_EQ(text(), L"Download file from Digital Level");
-  EXPECT_EQ(*at++, 8) << "points";
-  EXPECT_EQ(text(), L"MS Sans Serif");
-  const DWORD readOnlyText = ES_READONLY | ES_MULTILINE | ES_AUTOVSCROLL | WS_VSCROLL | WS_BORDER | WS_TABSTOP;
-  const struct { WORD id, atom; const wchar_t* text; RECT box; DWORD style; } expected[] = {
-      {IDCANCEL, 0x80, L"Cancel", {80, 157, 50, 14}, WS_TABSTOP},
-      {220, 0x80, L"Start", {140, 157, 50, 14}, WS_TABSTOP},
-      {215, 0x82, L"Status text", {45, 142, 215, 10}, 0},
-      {319, 0x82, L"Status:", {5, 142, 25, 10}, 0},
-      {214, 0x81, L"", {5, 5, 255, 112}, readOnlyText},
-      {320, 0x82, L"File name:", {5, 127, 35, 10}, 0},
-      {217, 0x82, L"Name", {45, 127, 215, 10}, 0},
+  RECT client{}, control{};
+  GetClientRect(dialog, &client);
+  EXPECT_EQ(client, pixels({0, 0, 267, 178 - up}));
+  EXPECT_EQ(ui::Text(dialog), caption);
+  const DWORD frame = WS_POPUP | WS_CAPTION | WS_SYSMENU | DS_MODALFRAME;
+  EXPECT_EQ(DWORD(GetWindowLongW(dialog, GWL_STYLE)) & frame, frame);
+  LOGFONTW font{};
+  GetObjectW(reinterpret_cast<HFONT>(SendMessageW(dialog, WM_GETFONT, 0, 0)), sizeof(font), &font);
+  EXPECT_STREQ(font.lfFaceName, L"MS Sans Serif");
+  const DWORD readOnlyText = ES_READONLY | ES_MULTILINE | ES_AUTOVSCROLL | WS_VSCROLL | WS_TABSTOP;
+  const struct { int id; const wchar_t *type, *text; RECT box; DWORD style; } expected[] = {
+      {IDCANCEL, L"Button", L"Cancel", {80, 157 - up, 50, 14}, WS_TABSTOP},
+      {220, L"Button", L"Start", {140, 157 - up, 50, 14}, WS_TABSTOP},
+      {215, L"Static", L"Status text", {45, 142 - up, 215, 10}, 0},
+      {319, L"Static", L"Status:", {5, 142 - up, 25, 10}, 0},
+      {214, L"Edit", L"", {5, 5, 255, 112 - up}, readOnlyText},
+      {320, L"Static", L"File name:", {5, 127 - up, 35, 10}, 0},
+      {217, L"Static", L"Name", {45, 127 - up, 215, 10}, 0},
   };
-  ASSERT_EQ(dialog->cdit, std::size(expected));
   for (const auto& e : expected) {
     SCOPED_TRACE(testing::Message() << "control " << e.id);
-    const auto* item = reinterpret_cast<const DLGITEMTEMPLATE*>((reinterpret_cast<ULONG_PTR>(at) + 3) & ~ULONG_PTR(3));
-    at = reinterpret_cast<const WORD*>(item + 1);
-    atom = 0;
-    text();  // class
-    EXPECT_EQ(atom, e.atom);
-    EXPECT_EQ(text(), e.text);
-    at += 1 + *at / sizeof(WORD);  // creation data
-    EXPECT_EQ(item->id, e.id);
-    const RECT box{item->x, item->y, item->cx, item->cy};
-    EXPECT_TRUE(EqualRect(&box, &e.box));
-    EXPECT_EQ(item->style & e.style, e.style);
-    EXPECT_EQ(item->style & (WS_CHILD | WS_VISIBLE), DWORD(WS_CHILD | WS_VISIBLE));
+    HWND item = GetDlgItem(dialog, e.id);
+    wchar_t type[16] = {};
+    GetClassNameW(item, type, 16);
+    EXPECT_STREQ(type, e.type);
+    EXPECT_EQ(ui::Text(item), e.text);
+    GetWindowRect(item, &control);
+    MapWindowPoints(nullptr, dialog, reinterpret_cast<POINT*>(&control), 2);
+    EXPECT_EQ(control, pixels(e.box));
+    EXPECT_EQ(DWORD(GetWindowLongW(item, GWL_STYLE)) & (e.style | WS_VISIBLE), e.style | WS_VISIBLE);
   }
+  DestroyWindow(dialog);
+}
+
+TEST(TransferDialogs, LayoutAndStyles) {
+  CheckTransferDialog(213, L"Download file from Digital Level", 0);
+  CheckTransferDialog(216, L"Upload file(s) to Digital Level", 32);
 }
 
 // The hidden window hands the view its notification only, and lets go of its pair before it

@@ -7,6 +7,7 @@
 #include <shlwapi.h>
 
 #include "base/resource_ids.h"
+#include "helpers/win_handles.h"
 #include "server/dialog_base.h"
 #include "store/string_table.h"
 
@@ -24,6 +25,28 @@ std::wstring Format(const wchar_t* format, int value) {
 int IntegerOf(const std::wstring& text) {
   long value = std::wcstol(text.c_str(), nullptr, 10);
   return static_cast<int>(std::clamp<long>(value, INT_MIN, INT_MAX));
+}
+
+// A decimal text as the C locale reads it, whatever locale the host process has set: the
+// stop bits "1.5" must not become 1 in a host that writes decimal commas.
+double DecimalOf(const std::wstring& text) {
+  size_t at = text.find_first_not_of(L" \t\r\n\v\f");
+  if (at == std::wstring::npos) return 0;
+  const bool negative = text[at] == L'-';
+  if (text[at] == L'-' || text[at] == L'+') ++at;
+  double digits = 0, scale = 1;
+  bool point = false;
+  for (; at < text.size(); ++at) {
+    if (text[at] >= L'0' && text[at] <= L'9') {
+      digits = digits * 10 + (text[at] - L'0');
+      if (point) scale *= 10;
+    } else if (text[at] == L'.' && !point) {
+      point = true;
+    } else {
+      break;
+    }
+  }
+  return (negative ? -digits : digits) / scale;
 }
 
 void SetLabel(HWND page, int id, UINT stringId) {
@@ -47,8 +70,9 @@ std::wstring DuplicateText(const std::wstring& name) {
 }  // namespace
 
 int EnumSerialPorts(std::vector<std::wstring>& ports) {
-  HKEY key = nullptr;
-  if (RegOpenKeyExW(HKEY_LOCAL_MACHINE, L"HARDWARE\\DEVICEMAP\\SERIALCOMM", 0, KEY_QUERY_VALUE, &key) != ERROR_SUCCESS)
+  win::UniqueHKey key;
+  if (RegOpenKeyExW(HKEY_LOCAL_MACHINE, L"HARDWARE\\DEVICEMAP\\SERIALCOMM", 0, KEY_QUERY_VALUE, key.Put()) !=
+      ERROR_SUCCESS)
     return 0;
   int count = 0;
   for (DWORD index = 0;; ++index) {
@@ -57,14 +81,13 @@ int EnumSerialPorts(std::vector<std::wstring>& ports) {
     DWORD nameLength = 64;
     DWORD dataSize = 128;
     DWORD type = REG_NONE;
-    if (RegEnumValueW(key, index, name, &nameLength, nullptr, &type, reinterpret_cast<BYTE*>(data), &dataSize) !=
+    if (RegEnumValueW(key.Get(), index, name, &nameLength, nullptr, &type, reinterpret_cast<BYTE*>(data), &dataSize) !=
             ERROR_SUCCESS ||
         type != REG_SZ)
       break;
     ports.emplace_back(data, wcsnlen(data, dataSize / sizeof(wchar_t)));
     ++count;
   }
-  RegCloseKey(key);
   return count;
 }
 
@@ -105,6 +128,10 @@ BOOL CStationGeneralPage::OnInitDialog() {
 
   std::vector<std::wstring> ports;
   EnumSerialPorts(ports);
+  // A port that is gone today (an adapter unplugged) still shows, so that an OK that didn't
+  // touch it stores it back as it was.
+  PortText = Format(L"COM%d", Record->Port);
+  if (std::find(ports.begin(), ports.end(), PortText) == ports.end()) ports.push_back(PortText);
   std::sort(ports.begin(), ports.end());  // ordinal; the list sorts again by its own rule
   for (const std::wstring& port : ports) PortList.AddString(port);
 
@@ -114,9 +141,11 @@ BOOL CStationGeneralPage::OnInitDialog() {
   SetLabel(Handle(), IDC_LABEL_MODEL, IDS_LABEL_MODEL);
   AddTranslated(ModelList, {IDS_MODEL_HRA20, IDS_MODEL_HRA40, IDS_MODEL_HRB1X});
 
+  // No more than the store can read back.
+  SendMessageW(Item(IDC_STATION_NAME), EM_LIMITTEXT, kMaxStationNameLength, 0);
+  SendMessageW(Item(IDC_STATION_NOTE), EM_LIMITTEXT, kMaxStationTextLength, 0);
   NameText = Record->Name;
   NoteText = Record->Manufacturer;
-  PortText = Format(L"COM%d", Record->Port);
   ModelText = Record->Model;
   UpdateData(true);
   initializing_ = false;
@@ -159,9 +188,7 @@ void CStationAdvancedPage::DoDataExchange(bool toControls) {
   if (ParityText == LoadTranslatedString(IDS_PARITY_NONE)) Record->Parity = 0;
   else if (ParityText == LoadTranslatedString(IDS_PARITY_ODD)) Record->Parity = 2;
   else if (ParityText == LoadTranslatedString(IDS_PARITY_EVEN)) Record->Parity = 1;
-  // The C runtime's own reader: the static one of the compiler's runtime would bring 17 KB
-  // of number parsing into the module for these three texts.
-  double stopBits = _wtof(StopBitsText.c_str());
+  const double stopBits = DecimalOf(StopBitsText);
   Record->StopBits = stopBits == 2.0 ? 2 : stopBits == 1.5 ? 15 : 1;
   Record->Flow = FlowText == LoadTranslatedString(IDS_FLOW_XONXOFF) ? 1 : 0;
   Record->CheckSum = CheckSumText == LoadTranslatedString(IDS_CHECKSUM_SET) ? 1 : 0;
@@ -255,7 +282,8 @@ int CStationDialog::ValidateStation(CStationRecord& record) {
     ShowError(LoadTranslatedString(IDS_NAME_BAD_CHARS));
     return 0;
   }
-  if (NewLevel) {
+  // A rename may not make two levels of one name either: a find would reach only one of them.
+  if (NewLevel || record.Name != NameOnEntry) {
     CStationRecord existing;
     existing.Name = record.Name;
     if (FindStation(existing) == S_OK) {
@@ -272,5 +300,8 @@ HRESULT CStationDialog::SaveStation() {
     GeneralPage.LevelAdded = 1;
     return result;
   }
-  return UpdateStation(NameOnEntry, *Record);
+  HRESULT result = UpdateStation(NameOnEntry, *Record);
+  // After an Apply that renamed, later saves look for the level under its new name.
+  if (result == S_OK) NameOnEntry = Record->Name;
+  return result;
 }

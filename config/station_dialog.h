@@ -79,7 +79,7 @@ class CStationDialog : public CPropertySheet {
   HRESULT SaveStation();
 
   BYTE NewLevel;
-  std::wstring NameOnEntry;  // never refreshed, not even by a rename through Apply
+  std::wstring NameOnEntry;  // the level's stored name; an Apply that renamed moves it on
   CStationRecord* Record;    // not owned
   CStationGeneralPage GeneralPage;
   CStationAdvancedPage AdvancedPage;

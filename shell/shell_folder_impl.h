@@ -27,8 +27,9 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
     if (!result) return E_INVALIDARG;
     *result = nullptr;
     return boundary::Call([&] {
+      // A level whose address doesn't fit would read as the root and list every level.
       wchar_t path[MAX_PATH];
-      GetFolderPath(path, MAX_PATH, false);
+      if (!GetFolderPath(path, MAX_PATH, false)) return E_FAIL;
       auto* list = new (std::nothrow) TEnum();
       if (!list) return E_OUTOFMEMORY;
       HRESULT hr = E_OUTOFMEMORY;
@@ -99,7 +100,7 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
   template <class T, class Attach>
   HRESULT MakeItemObject(LPCITEMIDLIST item, REFIID riid, void** result, Attach attach) {
     wchar_t path[MAX_PATH];
-    GetFolderPath(path, MAX_PATH, false);
+    if (!GetFolderPath(path, MAX_PATH, false)) return E_FAIL;
     LPITEMIDLIST folderList = m_pidlMgr->CreateListFromPath(path);
     LPITEMIDLIST full = m_pidlMgr->Concatenate(folderList, item);
     m_pidlMgr->Free(folderList);

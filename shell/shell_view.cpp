@@ -31,7 +31,7 @@ CMarlixDLShellView::~CMarlixDLShellView() {
   ShellFolder.Reset();
   if (Malloc) Malloc->Release();
   DestroyNotifyWindow(NotifyWindow);
-  if (MergedMenu) DestroyMenu(MergedMenu);
+  ReleaseMergedMenu();
   if (DragImage) ImageList_Destroy(DragImage);
   CommDlgBrowser.Reset();
   ShellBrowser.Reset();
@@ -60,9 +60,12 @@ STDMETHODIMP CMarlixDLShellView::GetWindow(HWND* window) {
 
 STDMETHODIMP CMarlixDLShellView::ContextSensitiveHelp(BOOL) { return E_NOTIMPL; }
 
-// The browser is always told S_FALSE, so it may also see a key that matched.
+// The browser is always told S_FALSE, so it may also see a key that matched. Hosts hand over
+// every message of their loop: a key typed in the address bar or an Open dialog's file-name
+// box is theirs, and a Delete there must not delete the selected level.
 STDMETHODIMP CMarlixDLShellView::TranslateAccelerator(MSG* msg) {
-  if (msg && Accelerators && IsWindow(ViewWindow)) ::TranslateAcceleratorW(ViewWindow, Accelerators, msg);
+  if (msg && Accelerators && IsWindow(ViewWindow) && (msg->hwnd == ViewWindow || IsChild(ViewWindow, msg->hwnd)))
+    ::TranslateAcceleratorW(ViewWindow, Accelerators, msg);
   return S_FALSE;
 }
 
@@ -134,10 +137,7 @@ STDMETHODIMP CMarlixDLShellView::CreateViewWindow(IShellView* previous, LPCFOLDE
 STDMETHODIMP CMarlixDLShellView::DestroyViewWindow() {
   com::ComPtr<CMarlixDLShellView> keep(this);  // the window's going may drop the last other reference
   UIActivate(SVUIA_DEACTIVATE);
-  if (MergedMenu) {
-    DestroyMenu(MergedMenu);
-    MergedMenu = nullptr;
-  }
+  ReleaseMergedMenu();
   if (IsWindow(ViewWindow)) DestroyWindow(ViewWindow);
   ShellBrowser.Reset();
   CommDlgBrowser.Reset();

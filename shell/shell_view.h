@@ -129,7 +129,7 @@ class CMarlixDLShellView
   friend LRESULT CALLBACK ViewWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
 
   // Window (shell_view_window.cpp)
-  LRESULT HandleMessage(UINT message, WPARAM wParam, LPARAM lParam);
+  LRESULT HandleMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
   LRESULT OnNotify(NMHDR* header);
   void OnViewWindowActive();
   bool CreateListWindow();
@@ -150,9 +150,13 @@ class CMarlixDLShellView
   void ActivateUI(UINT state);
   void DeactivateUI();
   void OnActivateItem();
+  void ReleaseMergedMenu();
   // Menus (shell_view_menus.cpp). `merged` places entries in the browser's menus;
   // otherwise each goes at the end of a popup of our own.
   void BuildMenus();
+  void RefreshMenuStates(HMENU popup);
+  UINT EntryState(UINT id);
+  bool CursorOverLevel();
   void OnContextMenu(int x, int y);
   void FillFileMenu(HMENU menu, bool merged);
   void FillViewMenu(HMENU menu, bool merged);
@@ -190,6 +194,7 @@ class CMarlixDLShellView
   HIMAGELIST DragImage = nullptr;
   POINT DragImagePos{};
   INT_PTR EnumThreadMarker = -1;
+  bool RefreshPending = false;  // a refresh came while an enumeration ran
   std::wstring AddNewText;
   NotifyWindowPair NotifyWindow;
   HACCEL Accelerators = nullptr;

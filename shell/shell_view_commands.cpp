@@ -70,15 +70,20 @@ void CMarlixDLShellView::ActivateUI(UINT state) {
 }
 
 void CMarlixDLShellView::DeactivateUI() {
-  if (UIState != SVUIA_DEACTIVATE && MergedMenu) {
-    if (ShellBrowser) {
-      ShellBrowser->SetMenuSB(nullptr, nullptr, nullptr);
-      ShellBrowser->RemoveMenusSB(MergedMenu);
-    }
-    DestroyMenu(MergedMenu);
-    MergedMenu = nullptr;
-  }
+  ReleaseMergedMenu();
   UIState = SVUIA_DEACTIVATE;
+}
+
+// The browser's own popups in the merged menu are given back before the menu goes: destroyed
+// with it, they would be gone from the browser too.
+void CMarlixDLShellView::ReleaseMergedMenu() {
+  if (!MergedMenu) return;
+  if (ShellBrowser) {
+    ShellBrowser->SetMenuSB(nullptr, nullptr, nullptr);
+    ShellBrowser->RemoveMenusSB(MergedMenu);
+  }
+  DestroyMenu(MergedMenu);
+  MergedMenu = nullptr;
 }
 
 // Opens the first selected row: a level is browsed into; the virtual file, which no

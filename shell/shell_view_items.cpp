@@ -14,14 +14,6 @@
 
 namespace {
 constexpr wchar_t kStationsFormat[] = L"Marlix Total Stations";
-// A paste gives up on a record whose "Copy of " names are all taken this many times over.
-constexpr int kMaxCopyPrefixes = 1000;
-
-bool LevelExists(const std::wstring& name) {
-  CStationRecord probe;
-  probe.Name = name;
-  return FindStation(probe) == S_OK;
-}
 }  // namespace
 
 std::vector<int> CMarlixDLShellView::SelectedRows() {
@@ -122,7 +114,8 @@ void CMarlixDLShellView::OnCopy() {
 }
 
 // Levels from the clipboard come in under a free name, "Copy of " in front as often as
-// needed; every other field as it came.
+// needed; every other field as it came. The store refuses a record it could not read back
+// whole; one whose every copy name is taken is left out.
 void CMarlixDLShellView::OnPaste() {
   com::ComPtr<IDataObject> clipboard;
   if (FAILED(OleGetClipboard(clipboard.Put())) || !clipboard) return;
@@ -139,12 +132,8 @@ void CMarlixDLShellView::OnPaste() {
       medium.Reset();
       const std::wstring prefix = LoadTranslatedString(IDS_COPY_OF);
       for (CStationRecord& record : records) {
-        std::wstring name = record.Name;
-        int tries = 0;
-        while (LevelExists(name) && ++tries <= kMaxCopyPrefixes) name = prefix + name;
-        if (tries > kMaxCopyPrefixes) continue;
-        record.Name = name;
-        AddStation(record);
+        record.Name = FreeCopyName(record.Name, prefix);
+        if (!record.Name.empty()) AddStation(record);
       }
       RefreshAll();
     }

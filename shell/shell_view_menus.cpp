@@ -1,5 +1,5 @@
 // The view's entries in the browser's File, Edit and View menus, and its context menu.
-// States are worked out each time a menu is built, and menus are rebuilt each time one opens.
+// States are worked out each time a menu is built, and again each time one of its popups opens.
 #include <utility>
 
 #include "base/resource_ids.h"
@@ -41,9 +41,10 @@ HMENU SubMenu(HMENU menu, UINT id) {
 
 }  // namespace
 
-// Runs at activation, at each mode change and at every WM_INITMENUPOPUP.
+// Runs at activation and at each mode change of an active view. An inactive view has no menu
+// in the browser: one built then would replace the active view's.
 void CMarlixDLShellView::BuildMenus() {
-  if (!ShellBrowser) return;
+  if (!ShellBrowser || UIState == SVUIA_DEACTIVATE) return;
   HMENU menu = CreateMenu();
   if (!menu) return;
   OLEMENUGROUPWIDTHS widths{};
@@ -73,21 +74,62 @@ void CMarlixDLShellView::BuildMenus() {
   }
 }
 
+// A popup about to open gets fresh states in place. Rebuilding the menu bar here would
+// destroy the bar that holds this very popup, and it would open without our entries.
+void CMarlixDLShellView::RefreshMenuStates(HMENU popup) {
+  for (int i = 0, count = GetMenuItemCount(popup); i < count; ++i) {
+    const UINT id = GetMenuItemID(popup, i);
+    if (id < kCmdNewLevel || id > kCmdActivate) continue;
+    MENUITEMINFOW item{sizeof(item)};
+    item.fMask = MIIM_STATE;
+    item.fState = EntryState(id);
+    SetMenuItemInfoW(popup, static_cast<UINT>(i), TRUE, &item);
+  }
+}
+
+// Level commands want a selection without the add row; Copy in the root wants the mouse over a
+// level row as well, and Paste wants a selection too, though Ctrl+V works without one.
+UINT CMarlixDLShellView::EntryState(UINT id) {
+  const bool selected = IsWindow(ListWindow) && SendMessageW(ListWindow, LVM_GETSELECTEDCOUNT, 0, 0) > 0;
+  const std::vector<int> rows = SelectedRows();
+  const UINT levelState = selected && (rows.empty() || rows.front() != 0) ? MFS_ENABLED : MFS_GRAYED;
+  switch (id) {
+    case kCmdActivate:
+      return MFS_DEFAULT | (selected ? 0 : MFS_GRAYED);
+    case kCmdDelete:
+    case kCmdProperties:
+    case kCmdPaste:
+      return levelState;
+    case kCmdCopy:
+      return selected && (FolderType() == PIDL_LEVEL || CursorOverLevel()) ? MFS_ENABLED : MFS_GRAYED;
+    case kCmdLargeIcons:
+    case kCmdSmallIcons:
+    case kCmdList:
+    case kCmdDetails:
+      return FolderSettings.ViewMode == FVM_ICON + (id - kCmdLargeIcons) ? MFS_CHECKED : MFS_ENABLED;
+    default:
+      return MFS_ENABLED;
+  }
+}
+
+bool CMarlixDLShellView::CursorOverLevel() {
+  if (!IsWindow(ListWindow)) return false;
+  LVHITTESTINFO hit{};
+  return GetCursorPos(&hit.pt) && ScreenToClient(ListWindow, &hit.pt) &&
+         SendMessageW(ListWindow, LVM_HITTEST, 0, reinterpret_cast<LPARAM>(&hit)) > 0;
+}
+
 // Select in a file dialog, Open elsewhere, and in the root the level commands. The
 // merged positions give, in the root: separator, Delete, Properties, Open, Create.
 void CMarlixDLShellView::FillFileMenu(HMENU menu, bool merged) {
   if (!PidlMgr || !PidlMgr->GetLast(FolderIdList)) return;
-  const bool selected = IsWindow(ListWindow) && SendMessageW(ListWindow, LVM_GETSELECTEDCOUNT, 0, 0) > 0;
-  const std::vector<int> rows = SelectedRows();
-  const bool addRowSelected = !rows.empty() && rows.front() == 0;
-  const UINT levelState = selected && !addRowSelected ? MFS_ENABLED : MFS_GRAYED;
-  AddEntry(menu, merged, 0, true, kCmdActivate, MFS_DEFAULT | (selected ? 0 : MFS_GRAYED), MFT_STRING,
+  AddEntry(menu, merged, 0, true, kCmdActivate, EntryState(kCmdActivate), MFT_STRING,
            CommDlgBrowser ? IDS_SELECT : IDS_OPEN);
   if (FolderType() != PIDL_ROOT) return;
   AddSeparator(menu, merged, 0, true);
-  AddEntry(menu, merged, 2, true, kCmdNewLevel, MFS_ENABLED, MFT_STRING, IDS_CREATE_LEVEL);
-  AddEntry(menu, merged, 1, true, kCmdDelete, levelState, MFT_STRING, IDS_DELETE);
-  AddEntry(menu, merged, 2, true, kCmdProperties, levelState, MFT_STRING, IDS_PROPERTIES);
+  AddEntry(menu, merged, 2, true, kCmdNewLevel, EntryState(kCmdNewLevel), MFT_STRING, IDS_CREATE_LEVEL);
+  AddEntry(menu, merged, 1, true, kCmdDelete, EntryState(kCmdDelete), MFT_STRING, IDS_DELETE);
+  AddEntry(menu, merged, 2, true, kCmdProperties, EntryState(kCmdProperties), MFT_STRING, IDS_PROPERTIES);
 }
 
 void CMarlixDLShellView::FillViewMenu(HMENU menu, bool merged) {
@@ -95,30 +137,17 @@ void CMarlixDLShellView::FillViewMenu(HMENU menu, bool merged) {
   const UINT texts[] = {IDS_LARGE_ICONS, IDS_SMALL_ICONS, IDS_LIST, IDS_DETAILS};
   for (UINT i = 0; i < 4; ++i) {
     const UINT id = kCmdLargeIcons + i;
-    const UINT state = FolderSettings.ViewMode == FVM_ICON + i ? MFS_CHECKED : MFS_ENABLED;
-    AddEntry(menu, merged, FCIDM_MENU_VIEW_SEP_OPTIONS, false, id, state, MFT_STRING | MFT_RADIOCHECK, texts[i]);
+    AddEntry(menu, merged, FCIDM_MENU_VIEW_SEP_OPTIONS, false, id, EntryState(id), MFT_STRING | MFT_RADIOCHECK,
+             texts[i]);
   }
 }
 
-// Copy in the root wants the mouse over a level row as well as a selection; Paste wants a
-// selection too, though Ctrl+V works without one.
 void CMarlixDLShellView::FillEditMenu(HMENU menu, bool merged) {
   const tagPIDLTYPE type = FolderType();
   if (type != PIDL_ROOT && type != PIDL_LEVEL) return;
-  const bool selected = IsWindow(ListWindow) && SendMessageW(ListWindow, LVM_GETSELECTEDCOUNT, 0, 0) > 0;
-  const std::vector<int> rows = SelectedRows();
-  const bool addRowSelected = !rows.empty() && rows.front() == 0;
-  bool overLevel = false;
-  if (type != PIDL_LEVEL && IsWindow(ListWindow)) {
-    LVHITTESTINFO hit{};
-    if (GetCursorPos(&hit.pt) && ScreenToClient(ListWindow, &hit.pt))
-      overLevel = SendMessageW(ListWindow, LVM_HITTEST, 0, reinterpret_cast<LPARAM>(&hit)) > 0;
-  }
-  const UINT copyState = selected && (type == PIDL_LEVEL || overLevel) ? MFS_ENABLED : MFS_GRAYED;
   AddSeparator(menu, merged, FCIDM_MENU_EDIT, false);
-  AddEntry(menu, merged, FCIDM_MENU_EDIT, false, kCmdCopy, copyState, MFT_STRING, IDS_COPY);
-  AddEntry(menu, merged, FCIDM_MENU_EDIT, false, kCmdPaste, selected && !addRowSelected ? MFS_ENABLED : MFS_GRAYED,
-           MFT_STRING, IDS_PASTE);
+  AddEntry(menu, merged, FCIDM_MENU_EDIT, false, kCmdCopy, EntryState(kCmdCopy), MFT_STRING, IDS_COPY);
+  AddEntry(menu, merged, FCIDM_MENU_EDIT, false, kCmdPaste, EntryState(kCmdPaste), MFT_STRING, IDS_PASTE);
 }
 
 // The chosen entry comes back as WM_COMMAND. A position of (-1, -1) from the keyboard is

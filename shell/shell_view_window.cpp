@@ -64,10 +64,10 @@ LRESULT CALLBACK ViewWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM
   // A message may end in the browser letting go of the view (browsing away).
   com::ComPtr<CMarlixDLShellView> keep(view);
   return boundary::CallWindow(window, message, wParam, lParam,
-                              [&] { return view->HandleMessage(message, wParam, lParam); });
+                              [&] { return view->HandleMessage(window, message, wParam, lParam); });
 }
 
-LRESULT CMarlixDLShellView::HandleMessage(UINT message, WPARAM wParam, LPARAM lParam) {
+LRESULT CMarlixDLShellView::HandleMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
   if (message == GetEnumIDListMessage) {
     FillList(reinterpret_cast<IEnumIDList*>(lParam));
     return 0;
@@ -84,11 +84,14 @@ LRESULT CMarlixDLShellView::HandleMessage(UINT message, WPARAM wParam, LPARAM lP
     case WM_DESTROY:
       ListControl.Detach();
       if (IsWindow(ListWindow)) RevokeDragDrop(ListWindow);
-      // No fill can come any more: whatever the thread hands over is released by it or here.
+      // No fill can come any more: whatever the thread hands over is released by it or here,
+      // and a window made again for this view enumerates afresh.
       ReleaseEnumJob();
+      EnumThreadMarker = -1;
+      RefreshPending = false;
       break;
     case WM_NCDESTROY:
-      SetWindowLongPtrW(ViewWindow, GWLP_USERDATA, 0);
+      SetWindowLongPtrW(window, GWLP_USERDATA, 0);
       ViewWindow = ListWindow = AnimateWindow = nullptr;
       break;
     case WM_SIZE:
@@ -115,10 +118,10 @@ LRESULT CMarlixDLShellView::HandleMessage(UINT message, WPARAM wParam, LPARAM lP
     case WM_COMMAND:
       return OnCommand(LOWORD(wParam));
     case WM_INITMENUPOPUP:
-      BuildMenus();
+      RefreshMenuStates(reinterpret_cast<HMENU>(wParam));
       return 0;
   }
-  return DefWindowProcW(ViewWindow, message, wParam, lParam);
+  return DefWindowProcW(window, message, wParam, lParam);
 }
 
 void CMarlixDLShellView::OnViewWindowActive() {
@@ -227,9 +230,14 @@ void CMarlixDLShellView::ApplyShellSettings() {
   SendMessageW(ListWindow, LVM_SETEXTENDEDLISTVIEWSTYLE, 0, extended);
 }
 
-// One thread at a time: a Refresh while one runs leaves that thread to fill the list.
+// One thread at a time. A refresh while one runs is remembered, and run once it has ended:
+// its result may already miss a level added or renamed meanwhile.
 void CMarlixDLShellView::StartEnumeration() {
-  if (EnumThreadMarker != -1 || !ShellFolder || !IsWindow(ViewWindow)) return;
+  if (EnumThreadMarker != -1) {
+    RefreshPending = true;
+    return;
+  }
+  if (!ShellFolder || !IsWindow(ViewWindow)) return;
   ReleaseEnumJob();
   // Made before the clip: with no job there is no thread to stop the clip again.
   auto* job = new (std::nothrow) EnumJob;
@@ -279,6 +287,13 @@ void CMarlixDLShellView::FillList(IEnumIDList*) {
   // The job's slot, not the message, says what is ours to take: whoever takes it releases it.
   IEnumIDList* list = RunningJob ? RunningJob->Result.exchange(nullptr) : nullptr;
   ReleaseEnumJob();
+  if (RefreshPending) {
+    // The list is empty since the refresh; a result older than it is not shown.
+    RefreshPending = false;
+    if (list) list->Release();
+    Refresh();
+    return;
+  }
   if (!list) return;
   if (!IsWindow(ListWindow) || !PidlMgr) {
     list->Release();

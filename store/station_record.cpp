@@ -132,6 +132,12 @@ bool UnpackRecord(Reader& in, CStationRecord& r) {
          in.Number(r.Flow) && in.Number(r.CheckSum);
 }
 
+bool LevelNameTaken(const std::wstring& name) {
+  CStationRecord probe;
+  probe.Name = name;
+  return FindStation(probe) == S_OK;
+}
+
 }  // namespace
 
 CStationRecord::CStationRecord() : Model(LoadTranslatedString(IDS_MODEL_HRA20)) {}
@@ -208,7 +214,15 @@ HRESULT FindStation(CStationRecord& record, wchar_t* keyName, DWORD* keyNameLeng
   return S_OK;
 }
 
+bool IsStorableStation(const CStationRecord& record) {
+  return !record.Name.empty() && record.Name.size() <= kMaxStationNameLength &&
+         record.Name.find_first_of(L"\\/") == std::wstring::npos && record.Manufacturer.size() <= kMaxStationTextLength &&
+         record.Model.size() <= kMaxStationTextLength;
+}
+
 HRESULT AddStation(CStationRecord& record) {
+  // Checked before anything is made: a level that can't be read back would stay as a hidden key.
+  if (!IsStorableStation(record)) return kUnstorableStation;
   if (FindStation(record) == S_OK) return E_INVALIDARG;
   win::UniqueHKey levels;
   if (OpenLevelsKey(levels) != ERROR_SUCCESS) return E_FAIL;
@@ -239,6 +253,7 @@ static HRESULT FindKeyAndOpenLevels(CStationRecord stored, wchar_t (&keyName)[kK
 }
 
 HRESULT UpdateStation(const std::wstring& oldName, const CStationRecord& record) {
+  if (!IsStorableStation(record)) return kUnstorableStation;
   CStationRecord stored = record;
   stored.Name = oldName;
   wchar_t keyName[kKeyNameChars];
@@ -283,12 +298,23 @@ HRESULT DeleteStation(const CStationRecord& record) {
 
 std::wstring MakeUniqueStationName(const std::wstring& base) {
   for (unsigned i = 1;; ++i) {
-    CStationRecord probe;
-    probe.Name = base;
-    if (i > 1) probe.Name += L" (" + DecimalText(i) + L")";
-    std::wstring candidate = probe.Name;
-    if (FindStation(probe) != S_OK) return candidate;
+    std::wstring candidate = i > 1 ? base + L" (" + DecimalText(i) + L")" : base;
+    if (!LevelNameTaken(candidate)) return candidate;
   }
+}
+
+std::wstring FreeCopyName(const std::wstring& name, const std::wstring& prefix) {
+  std::wstring candidate = name;
+  while (LevelNameTaken(candidate)) {
+    std::wstring next = prefix + candidate;
+    if (next.size() > kMaxStationNameLength) {
+      next.resize(kMaxStationNameLength);
+      if (IS_HIGH_SURROGATE(next.back())) next.pop_back();  // never half a character
+    }
+    if (next == candidate) return {};
+    candidate = std::move(next);
+  }
+  return candidate;
 }
 
 HGLOBAL PackStations(const std::vector<CStationRecord>& records) {

@@ -21,6 +21,17 @@ class CStationRecord {
   std::wstring Model;
 };
 
+// The longest name a level may have: the longest address built from it, the file's parsing
+// name "::{D8B818CA-E47C-49a1-96A5-C2AA5FB57F15}\<name>\file1.tkf", then fills a 260-character
+// buffer exactly. Every other road (folder, path, tip, status text, copy) has room to spare.
+inline constexpr size_t kMaxStationNameLength = 208;
+// The longest note or model text: what a registry read of 520 bytes gives back.
+inline constexpr size_t kMaxStationTextLength = 259;
+// What the store answers for a record it would not be able to read back whole, or whose
+// name the namespace could not show as one level (empty, or with a path separator in it).
+inline constexpr HRESULT kUnstorableStation = static_cast<HRESULT>(0x8000000BL);  // E_BOUNDS
+bool IsStorableStation(const CStationRecord& record);
+
 // Widths of the view's two columns, read at module start and written at module end.
 extern int ColumnWidths[2];
 
@@ -43,12 +54,17 @@ void WriteStation(const CStationRecord& record, HKEY key);
 LONG ReadStationString(HKEY key, const wchar_t* value, std::wstring& out);
 
 HRESULT FindStation(CStationRecord& record, wchar_t* keyName = nullptr, DWORD* keyNameLength = nullptr);
-// E_INVALIDARG if the name is taken, in which case `record` now holds the stored level.
+// E_INVALIDARG if the name is taken, in which case `record` now holds the stored level;
+// kUnstorableStation, with nothing written, for a record that could not be read back.
 HRESULT AddStation(CStationRecord& record);
+// kUnstorableStation, with nothing written, for a record that could not be read back.
 HRESULT UpdateStation(const std::wstring& oldName, const CStationRecord& record);
 HRESULT DeleteStation(const CStationRecord& record);
 // The base, or the base with " (2)", " (3)", ... : the first name no level has.
 std::wstring MakeUniqueStationName(const std::wstring& base);
+// The name a pasted level takes: `name` while free, else `prefix` in front as often as needed,
+// cut to kMaxStationNameLength. Empty once the prefixes fill the whole name and it is still taken.
+std::wstring FreeCopyName(const std::wstring& name, const std::wstring& prefix);
 
 // Deletes a key and everything below it. ERROR_BADKEY for an empty name.
 LONG DeleteKeyTree(HKEY parent, const wchar_t* name);

@@ -55,6 +55,7 @@ TEST_F(StationSheet, SerialPortListEndsAtTheFirstValueItCannotTake) {
 }
 
 TEST_F(StationSheet, NewLevelListsThePortsSortedShowsTheDefaultsAndAddsWithEveryCodeMapped) {
+  ASSERT_TRUE(_wsetlocale(LC_ALL, L"German")) << "a host that writes decimal commas";
   CStationRecord level;  // the defaults a new level starts from
   EXPECT_EQ(RunSheet(level, true, [](HWND sheet) {
     HWND general = Page(sheet, 0);
@@ -82,13 +83,12 @@ TEST_F(StationSheet, NewLevelListsThePortsSortedShowsTheDefaultsAndAddsWithEvery
     EXPECT_FALSE(ApplyEnabled(sheet));
     Press(sheet, IDOK);
   }), IDOK);
+  _wsetlocale(LC_ALL, L"C");
   EXPECT_EQ(StoredLevels(), Strings{L"North|10|115200|15|1|7|1|0|tripod 4|HRB1X"});
 }
 
 TEST_F(StationSheet, RefusedNamesKeepTheSheetOpenAndTheStoreUntouched) {
   Stored(L"Level");
-  const std::wstring name259(259, L'n');
-  Stored(name259);
   const Strings before = StoredLevels();
   CStationRecord level;
   EXPECT_EQ(RunSheet(level, true, [&](HWND sheet) {
@@ -100,8 +100,7 @@ TEST_F(StationSheet, RefusedNamesKeepTheSheetOpenAndTheStoreUntouched) {
         {L"A\\B", badChars},
         {L"A*B", badChars},
         {L"A\"B", badChars},
-        {L"Level", L"The digital level 'Level' already exists"},
-        {name259, (L"The digital level '" + name259 + L"' already exists").substr(0, 259)}};
+        {L"Level", L"The digital level 'Level' already exists"}};
     for (const auto& [name, message] : cases) {
       Type(general, 203, name);
       Press(sheet, IDOK);
@@ -109,16 +108,15 @@ TEST_F(StationSheet, RefusedNamesKeepTheSheetOpenAndTheStoreUntouched) {
       EXPECT_EQ(Text(general, 203), name) << "what the user typed stays";
       EXPECT_EQ(StoredLevels(), before);
     }
+    Type(general, 204, std::wstring(300, L'n'));
+    EXPECT_EQ(Text(general, 204).size(), kMaxStationTextLength) << "a note the store can read back";
+    Type(general, 203, std::wstring(300, L'l'));
+    EXPECT_EQ(Text(general, 203).size(), kMaxStationNameLength) << "a name every road can carry";
     Type(general, 203, L"level");
     Press(sheet, IDOK);
   }), IDOK);
-  EXPECT_EQ(StoredLevels().size(), 3u);
+  EXPECT_EQ(StoredLevels().size(), 2u);
   EXPECT_EQ(Level(L"level").Name, L"level") << "case counts";
-}
-
-TEST_F(StationSheet, NamesTooLongForTheStoreAreNeverDuplicates) {
-  CStationRecord level = Stored(std::wstring(300, L'x'));
-  EXPECT_EQ(CStationDialog(nullptr, level, true).ValidateStation(level), 1);
 }
 
 TEST_F(StationSheet, EditingWithoutTheAdvancedTabStoresItsFieldsExactlyAsRead) {
@@ -126,15 +124,15 @@ TEST_F(StationSheet, EditingWithoutTheAdvancedTabStoresItsFieldsExactlyAsRead) {
   odd.BaudRate = 7, odd.StopBits = 0, odd.Parity = 7, odd.DataBits = 5, odd.Flow = 3, odd.CheckSum = 9;
   ASSERT_EQ(UpdateStation(L"Odd codes", odd), S_OK);
   CStationRecord level = Level(L"Odd codes");
-  SetSerialPorts({});  // no SERIALCOMM key: no ports, and the port stored is 0
+  SetSerialPorts({});  // no SERIALCOMM key: the stored port, unplugged, shows all the same
   EXPECT_EQ(RunSheet(level, false, [](HWND sheet) {
-    EXPECT_EQ(Entries(Page(sheet, 0), 205), Strings{});
+    EXPECT_EQ(Entries(Page(sheet, 0), 205), Strings{L"COM1"});
     EXPECT_FALSE(ApplyEnabled(sheet)) << "nothing changed yet";
     Type(Page(sheet, 0), 204, L"new");
     EXPECT_TRUE(ApplyEnabled(sheet));
     Press(sheet, IDOK);
   }), IDOK);
-  EXPECT_EQ(StoredLevels(), Strings{L"Odd codes|0|7|0|7|5|3|9|new|HRA20"});
+  EXPECT_EQ(StoredLevels(), Strings{L"Odd codes|1|7|0|7|5|3|9|new|HRA20"});
 }
 
 TEST_F(StationSheet, UnknownStoredValuesShowAsTheTablesSayAndStoreBackSo) {
@@ -144,7 +142,7 @@ TEST_F(StationSheet, UnknownStoredValuesShowAsTheTablesSayAndStoreBackSo) {
   ASSERT_EQ(UpdateStation(L"Twelve", stored), S_OK);
   CStationRecord level = Level(L"Twelve");
   EXPECT_EQ(RunSheet(level, false, [](HWND sheet) {
-    EXPECT_EQ(Selected(Page(sheet, 0), 205), L"<none>") << "COM1 is no port here, though COM10 begins with it";
+    EXPECT_EQ(Selected(Page(sheet, 0), 205), L"COM1") << "no port here today, yet the level's";
     EXPECT_EQ(Selected(Page(sheet, 0), 206), L"<none>") << "HRA2 is no model";
     ShowTab(sheet, 1);
     Strings shown;
@@ -152,7 +150,7 @@ TEST_F(StationSheet, UnknownStoredValuesShowAsTheTablesSayAndStoreBackSo) {
     EXPECT_EQ(shown, (Strings{L"1200", L"None", L"1"})) << "12 begins 1200";
     Press(sheet, IDOK);
   }), IDOK);
-  EXPECT_EQ(StoredLevels(), Strings{L"Twelve|0|1200|1|0|8|0|1||"});
+  EXPECT_EQ(StoredLevels(), Strings{L"Twelve|1|1200|1|0|8|0|1||"});
 
   level = Level(L"Twelve");
   level.BaudRate = 7, level.StopBits = 15, level.Parity = 2;
@@ -168,17 +166,21 @@ TEST_F(StationSheet, UnknownStoredValuesShowAsTheTablesSayAndStoreBackSo) {
   EXPECT_EQ(StoredLevels(), Strings{L"Twelve|0|0|15|2|8|0|1||"});
 }
 
-TEST_F(StationSheet, RenameByApplyThenOkLosesTheSecondSaveWithoutAWord) {
+TEST_F(StationSheet, ARenameMakesNoTwinAndLaterSavesFollowTheNewName) {
   Stored(L"A", L"first");
+  Stored(L"Other");
   CStationRecord level = Level(L"A");
   EXPECT_EQ(RunSheet(level, false, [](HWND sheet) {
+    Type(Page(sheet, 0), 203, L"Other");
+    Press(sheet, 12321);
+    EXPECT_EQ(ReadBox(sheet, kErrorCaption), L"The digital level 'Other' already exists");
     Type(Page(sheet, 0), 203, L"B");
     Press(sheet, 12321);
-    EXPECT_TRUE(WaitFor([] { return StoredLevels() == Strings{L"B|1|9600|1|0|8|0|1|first|HRA20"}; }));
+    EXPECT_TRUE(WaitFor([] { return StoredLevels()[0] == L"B|1|9600|1|0|8|0|1|first|HRA20"; }));
     Type(Page(sheet, 0), 204, L"second");
     Press(sheet, IDOK);
   }), IDOK);
-  EXPECT_EQ(StoredLevels(), Strings{L"B|1|9600|1|0|8|0|1|first|HRA20"}) << "the OK looked for A";
+  EXPECT_EQ(StoredLevels(), (Strings{L"B|1|9600|1|0|8|0|1|second|HRA20", L"Other|1|9600|1|0|8|0|1||HRA20"}));
 }
 
 // Run by scripts/sheet-screenshots.

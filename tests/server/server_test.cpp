@@ -43,24 +43,6 @@ TEST_F(ServerModule, FailedScriptLeavesAttributesUnwritten) {
   EXPECT_EQ(server_.UnregisterServer(), S_OK) << "unregistering stops at the same entry and still answers S_OK";
   EXPECT_FALSE(RegKeyExists(kHKCR, kFolderKey));
 }
-TEST(ObjectMap, EightEntriesInTheirOrderWithTheirScripts) {
-  const std::pair<const CLSID*, UINT> expected[] = {
-      {&CLSID_MarlixDLShellFolder, 6},
-      {&CLSID_MarlixDLShellView, 7},
-      {&CLSID_MarlixDLEnumIDList, 3},
-      {&CLSID_MarlixDLExtractIcon, 4},
-      {&CLSID_MarlixDLDataObject, 2},
-      {&CLSID_MarlixDLQueryInfo, 5},
-      {&CLSID_MarlixDLDropTarget, 8},
-      {&CLSID_MarlixDLDropTargetOnListView, 9},
-  };
-  const auto map = ModuleObjectMap();
-  ASSERT_EQ(map.size(), std::size(expected));
-  for (size_t i = 0; i < map.size(); ++i) {
-    EXPECT_TRUE(IsEqualCLSID(*map[i].clsid, *expected[i].first)) << "entry " << i;
-    EXPECT_EQ(map[i].script, expected[i].second) << "entry " << i;
-  }
-}
 // A failed entry ends the unregistration of entries and of the type library.
 TEST_F(ServerModule, UnregisteringStopsAtAFailedEntry) {
   ASSERT_EQ(server_.RegisterServer(), S_OK);

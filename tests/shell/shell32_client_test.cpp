@@ -10,6 +10,7 @@
 #include <functional>
 #include <thread>
 
+#include "config/sheet_driver.h"
 #include "support/registry_sandbox.h"
 
 namespace {
@@ -61,19 +62,41 @@ std::vector<std::wstring> Rows(HWND list) {
   return rows;
 }
 
+// A person presses Delete with the focus in `window`, and the host goes on until `done`.
+// `view`, if given, is the host's current view, to which its loop hands every key first as
+// Explorer's window does; otherwise the host is another thread.
+bool TypeDelete(HWND window, const std::function<bool()>& done, IShellView* view = nullptr) {
+  HWND top = GetAncestor(window, GA_ROOT);
+  SetForegroundWindow(top);
+  SendMessageW(top, WM_NEXTDLGCTL, reinterpret_cast<WPARAM>(window), TRUE);
+  if (view) SetFocus(window);
+  INPUT keys[2] = {{INPUT_KEYBOARD}, {INPUT_KEYBOARD}};
+  keys[0].ki.wVk = keys[1].ki.wVk = VK_DELETE;
+  keys[1].ki.dwFlags = KEYEVENTF_KEYUP;
+  SendInput(2, keys, sizeof(INPUT));
+  if (!view) return sheet::WaitFor(done);
+  for (DWORD start = GetTickCount(); !done(); MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT)) {
+    if (GetTickCount() - start > 10000) return false;
+    for (MSG msg; PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE); DispatchMessageW(&msg))
+      if (msg.message == WM_KEYDOWN) view->TranslateAccelerator(&msg);
+  }
+  return true;
+}
+
 // Wine's ExplorerBrowser hosts the view as Explorer's window does: the browser makes
 // the view, the view's thread fills it, and activating a level moves the browser.
 TEST(ExplorerBrowserClient, ShowsTheLevelsAndMovesIntoALevelWhenItIsActivated) {
   RegistrySandbox sandbox;
   SeedLevel(0, L"South Site");
   SeedLevel(1, L"North Site");
-  HWND frame = CreateWindowExW(0, L"STATIC", nullptr, WS_OVERLAPPEDWINDOW, 0, 0, 640, 480, nullptr, nullptr,
+  SeedLevel(2, L"Spare");
+  HWND frame = CreateWindowExW(0, L"STATIC", nullptr, WS_POPUP | WS_VISIBLE, 0, 0, 640, 480, nullptr, nullptr,
                                nullptr, nullptr);
   com::ComPtr<IExplorerBrowser> browser = BrowseToFolder(frame, {0, 0, 600, 400});
   ASSERT_TRUE(browser);
   HWND list = CurrentList(browser.Get());
   ASSERT_TRUE(list);
-  EXPECT_EQ(Rows(list), (std::vector<std::wstring>{L"Add New Digital Level", L"North Site", L"South Site"}));
+  EXPECT_EQ(Rows(list), (std::vector<std::wstring>{L"Add New Digital Level", L"North Site", L"South Site", L"Spare"}));
   EXPECT_EQ(static_cast<DWORD>(GetWindowLongW(list, GWL_STYLE)), 0x50010149u) << "Details, as the browser asked";
   SHELLFLAGSTATE shell{};
   shell.fWin95Classic = TRUE;  // what a shell that doesn't know the setting leaves
@@ -87,6 +110,14 @@ TEST(ExplorerBrowserClient, ShowsTheLevelsAndMovesIntoALevelWhenItIsActivated) {
   ASSERT_EQ(view->QueryInterface(IID_IOleCommandTarget, commands.PutVoid()), S_OK);
   EXPECT_EQ(commands->Exec(nullptr, 1284, 0, nullptr, nullptr), S_OK);
   EXPECT_EQ(static_cast<DWORD>(GetWindowLongW(list, GWL_STYLE)), 0x5001014Au) << "Small Icons";
+  // A Delete typed in the frame's address bar is the bar's; the same key in the list deletes.
+  HWND address = CreateWindowExW(0, L"EDIT", L"Levels", WS_CHILD | WS_VISIBLE, 0, 410, 600, 20, frame, nullptr,
+                                 nullptr, nullptr);
+  ListView_SetItemState(list, 3, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
+  EXPECT_TRUE(TypeDelete(address, [&] { return ui::Text(address) != L"Levels"; }, view.Get()));
+  EXPECT_EQ(sheet::StoredLevels().size(), 3u) << "a key of the address bar deletes no level";
+  EXPECT_TRUE(TypeDelete(list, [] { return sheet::StoredLevels().size() == 2; }, view.Get())) << "the list's";
+  list = CurrentList(browser.Get());
   view.Reset(), commands.Reset();
 
   ListView_SetItemState(list, 2, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
@@ -110,6 +141,18 @@ struct OpenDialogRun {
 };
 OpenDialogRun* openDialog = nullptr;
 constexpr UINT kBrowseTo = WM_APP + 1;
+
+// Windows' file dialog hands every key of its loop to its view first; Wine's never asks its
+// view, so this hook on the dialog's thread does what Windows' dialog does.
+LRESULT CALLBACK ViewKeysFirst(int code, WPARAM wParam, LPARAM lParam) {
+  auto* msg = reinterpret_cast<MSG*>(lParam);
+  com::ComPtr<IShellView> view;
+  auto* browser = openDialog->dialog ? reinterpret_cast<IShellBrowser*>(SendMessageW(openDialog->dialog, WM_USER + 7, 0, 0))
+                                     : nullptr;
+  if (code == MSGF_DIALOGBOX && msg->message == WM_KEYDOWN && browser && browser->QueryActiveShellView(view.Put()) == S_OK)
+    view->TranslateAccelerator(msg);
+  return CallNextHookEx(nullptr, code, wParam, lParam);
+}
 
 UINT_PTR CALLBACK OpenDialogHook(HWND hook, UINT message, WPARAM, LPARAM lParam) {
   if (message == WM_INITDIALOG) openDialog->hook = hook;
@@ -144,7 +187,9 @@ void ActivateRow(HWND list, int row) {
 
 TEST(OpenDialogClient, ListsTheLevelsOpensOneAndTakesItsFileAsTheDefaultCommand) {
   RegistrySandbox sandbox;
-  SeedLevel(0, L"North Site");
+  const std::wstring longest(kMaxStationNameLength, L'n');  // its file's address is the longest of all
+  SeedLevel(0, longest);
+  SeedLevel(1, L"Spare");
   OpenDialogRun run;
   openDialog = &run;
   UniqueList folder;
@@ -155,8 +200,22 @@ TEST(OpenDialogClient, ListsTheLevelsOpensOneAndTakesItsFileAsTheDefaultCommand)
     PumpUntil([&] { return run.dialog.load() != nullptr; });
     if (!run.dialog) return;
     browsed = static_cast<HRESULT>(SendMessageW(run.hook, kBrowseTo, 0, reinterpret_cast<LPARAM>(folder.Get())));
-    HWND list = DialogList(run.dialog, 2);
+    HWND list = DialogList(run.dialog, 3);
     rootRows = list ? Rows(list) : rootRows;
+    // A Delete typed in the file-name box is the box's; the same key in the list deletes.
+    HWND name = nullptr;  // the edit inside the file-name combo box
+    EnumChildWindows(GetDlgItem(run.dialog, cmb13), [](HWND child, LPARAM found) {
+      wchar_t type[8] = {};
+      GetClassNameW(child, type, 8);
+      return lstrcmpiW(type, L"Edit") ? TRUE : (*reinterpret_cast<HWND*>(found) = child, FALSE);
+    }, reinterpret_cast<LPARAM>(&name));
+    ASSERT_TRUE(name);
+    if (list) ListView_SetItemState(list, 2, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
+    SetWindowTextW(name, L"x");  // after the selection, which the dialog copies into the box
+    EXPECT_TRUE(TypeDelete(name, [&] { return ui::Text(name).empty(); }));
+    EXPECT_EQ(sheet::StoredLevels().size(), 2u) << "a key of the file-name box deletes no level";
+    EXPECT_TRUE(list && TypeDelete(list, [] { return sheet::StoredLevels().size() == 1; })) << "the list's";
+    list = DialogList(run.dialog, 2);
     if (list) ActivateRow(list, 1);
     HWND levelList = DialogList(run.dialog, 1);
     levelRows = levelList ? Rows(levelList) : levelRows;
@@ -170,15 +229,17 @@ TEST(OpenDialogClient, ListsTheLevelsOpensOneAndTakesItsFileAsTheDefaultCommand)
   ofn.nMaxFile = MAX_PATH;
   ofn.Flags = OFN_EXPLORER | OFN_ENABLEHOOK;
   ofn.lpfnHook = OpenDialogHook;
+  HHOOK keys = SetWindowsHookExW(WH_MSGFILTER, ViewKeysFirst, nullptr, GetCurrentThreadId());
   BOOL chosen = GetOpenFileNameW(&ofn);
+  UnhookWindowsHookEx(keys);
   person.join();
   openDialog = nullptr;
   EXPECT_EQ(browsed, S_OK);
-  EXPECT_EQ(rootRows, (std::vector<std::wstring>{L"Add New Digital Level", L"North Site"}));
+  EXPECT_EQ(rootRows, (std::vector<std::wstring>{L"Add New Digital Level", longest, L"Spare"}));
   EXPECT_EQ(levelRows, std::vector<std::wstring>{L"file1.tkf"});
   EXPECT_EQ(run.fileOk, 1) << "the file reached the dialog's default command";
   EXPECT_TRUE(chosen);
-  EXPECT_STREQ(file, (kParsingRoot + L"\\North Site\\file1.tkf").c_str());
+  EXPECT_STREQ(file, (kParsingRoot + L"\\" + longest + L"\\file1.tkf").c_str()) << "259 characters";
 }
 
 // Runs last: the test above has released all it got from the shell.

@@ -85,3 +85,21 @@ void Mouse(DWORD flags, POINT at) {
   input.mi.dwFlags = flags | MOUSEEVENTF_MOVE | MOUSEEVENTF_ABSOLUTE;
   SendInput(1, &input, sizeof(input));
 }
+
+long KernelHandleCount() {
+  using Query = LONG(WINAPI*)(ULONG, void*, ULONG, ULONG*);
+  auto query = reinterpret_cast<Query>(
+      reinterpret_cast<void*>(GetProcAddress(GetModuleHandleW(L"ntdll.dll"), "NtQuerySystemInformation")));
+  struct Entry { ULONG pid; BYTE type, flags; USHORT value; void* object; ULONG access; };
+  std::vector<BYTE> buffer(1 << 20);
+  ULONG size = 0;
+  while (query(16 /* SystemHandleInformation */, buffer.data(), static_cast<ULONG>(buffer.size()), &size) ==
+         static_cast<LONG>(0xC0000004))
+    buffer.resize(buffer.size() * 2);
+  ULONG count = *reinterpret_cast<ULONG*>(buffer.data());
+  auto* entries = reinterpret_cast<Entry*>(buffer.data() + sizeof(void*));
+  long mine = 0;
+  for (ULONG i = 0; i < count && sizeof(void*) + (i + 1) * sizeof(Entry) <= buffer.size(); ++i)
+    mine += entries[i].pid == GetCurrentProcessId();
+  return mine;
+}

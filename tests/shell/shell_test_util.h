@@ -29,5 +29,8 @@ bool PumpUntil(const std::function<bool()>& done, DWORD milliseconds = 10000);
 com::ComPtr<IExplorerBrowser> BrowseToFolder(HWND frame, RECT rect);
 // The list of the browser's current view, once its thread has filled it.
 HWND CurrentList(IExplorerBrowser* browser);
+// Kernel handles of this process (registry keys among them), from the system's handle list:
+// Wine answers 0 to GetProcessHandleCount.
+long KernelHandleCount();
 // Real mouse input at a screen point, as SendInput gives it.
 void Mouse(DWORD flags, POINT at);

@@ -21,10 +21,6 @@
 #include "shell/shell_view.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
-// The transfer tests' helpers name their id list builder as the shell's do their id list type.
-#define IdList TransferIdList
-#include "transfer/data_test_support.h"
-#undef IdList
 
 namespace {
 using Texts = std::vector<std::wstring>;
@@ -42,14 +38,19 @@ int ThreadCount() {
 // The browser's window records the commands sent to it. Across processes it tells how
 // often its view reloaded (kReloads), and ends a peer (kPeerDone).
 std::vector<WPARAM> frameCommands;
-constexpr UINT kReloads = WM_APP, kPeerDone = WM_APP + 1;
+constexpr UINT kReloads = WM_APP, kPeerDone = WM_APP + 1, kEndMenu = WM_APP + 2;
 bool peerDone = false;
 LRESULT CALLBACK FrameProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+  // As Explorer's frame does, what its merged menu shows and chooses goes to the active view.
+  auto* active = static_cast<HWND>(GetPropW(window, L"active"));
+  if (active && (message == WM_INITMENUPOPUP || (message == WM_COMMAND && wParam >= kCmdNewLevel && wParam <= kCmdActivate)))
+    return SendMessageW(active, message, wParam, lParam);
   if (message == WM_COMMAND) frameCommands.push_back(wParam);
   if (message == WM_COMMAND && wParam == kCmdBrowserRefresh)
     SetPropW(window, L"reloads", reinterpret_cast<HANDLE>(reinterpret_cast<INT_PTR>(GetPropW(window, L"reloads")) + 1));
   if (message == kReloads) return reinterpret_cast<LRESULT>(GetPropW(window, L"reloads"));
   if (message == kPeerDone) peerDone = true;
+  if (message == kEndMenu) EndMenu();  // a menu left open by a failed choice
   return DefWindowProcW(window, message, wParam, lParam);
 }
 
@@ -105,21 +106,26 @@ class FakeBrowser : public com::ComObject<IShellBrowser, ICommDlgBrowser> {
   STDMETHODIMP ContextSensitiveHelp(BOOL) override { return E_NOTIMPL; }
   // As Explorer merges: File, Edit and View popups holding entries of the browser's own.
   STDMETHODIMP InsertMenusSB(HMENU menu, LPOLEMENUGROUPWIDTHS) override {
+    ++lent;
     AddPopup(menu, FCIDM_MENU_FILE, L"&File", {{0x7001, L"Close"}});
     AddPopup(menu, FCIDM_MENU_EDIT, L"&Edit", {{0x7002, L"Undo"}});
     AddPopup(menu, FCIDM_MENU_VIEW, L"&View",
              {{0x7003, L"Status Bar"}, {FCIDM_MENU_VIEW_SEP_OPTIONS, L"-"}, {0x7004, L"Options"}});
     return S_OK;
   }
-  STDMETHODIMP SetMenuSB(HMENU menu, HOLEMENU, HWND) override {
+  STDMETHODIMP SetMenuSB(HMENU menu, HOLEMENU, HWND active) override {
     shown = menu;
+    SetMenu(frame, menu);
+    SetPropW(frame, L"active", active);
     return S_OK;
   }
   STDMETHODIMP RemoveMenusSB(HMENU menu) override {
+    --lent;
     while (GetMenuItemCount(menu) > 0) DeleteMenu(menu, 0, MF_BYPOSITION);
     return S_OK;
   }
   HMENU shown = nullptr;  // the menu bar the view gave the browser
+  int lent = 0;           // menus filled with this browser's popups and not given back
   STDMETHODIMP SetStatusTextSB(LPCWSTR) override { return S_OK; }
   STDMETHODIMP EnableModelessSB(BOOL) override { return S_OK; }
   STDMETHODIMP TranslateAcceleratorSB(MSG*, WORD) override { return S_FALSE; }
@@ -210,6 +216,7 @@ class View : public ::testing::Test {
   void TearDown() override {
     for (auto& view : views_) view->DestroyViewWindow();
     views_.clear();
+    EXPECT_EQ(browser_->lent, 0) << "every merged menu given back to the browser";
     browser_.Reset();
     root_.Reset();
     EXPECT_TRUE(PumpUntil([&] { return com::ModuleLockCount() == before_; })) << "every object let go";
@@ -234,8 +241,8 @@ class View : public ::testing::Test {
     EXPECT_EQ(folder->CreateViewObject(nullptr, IID_IShellView, view.PutVoid()), S_OK);
     return Show(view.Get(), mode, previous, browser, wait);
   }
-  com::ComPtr<IShellFolder> Alpha() {
-    UniqueList alpha = MakeId(PIDL_LEVEL, L"alpha");
+  com::ComPtr<IShellFolder> Alpha(const wchar_t* name = L"alpha") {
+    UniqueList alpha = MakeId(PIDL_LEVEL, name);
     return Bind(root_.Get(), alpha.Get());
   }
   IShellView* Last() { return views_.back().Get(); }
@@ -283,6 +290,7 @@ TEST_F(View, EachModeHasItsPicturesAndOnlyDetailsEnumeratesAgain) {
   HWND view = Open(root_.Get(), FVM_ICON);
   Command(view, kCmdSmallIcons);
   EXPECT_EQ(Mode(Last()), 2u);
+  EXPECT_EQ(browser_->shown, nullptr) << "an inactive view has no menu to rebuild";
   EXPECT_FALSE(AnimationOf(view));
   Command(view, kCmdDetails);
   EXPECT_TRUE(AnimationOf(view)) << "Details enumerates again";
@@ -330,10 +338,12 @@ TEST_F(View, ActivationShowsTheRootNameAndTheFolderAddressInTheStatusBar) {
   EXPECT_EQ(Last()->UIActivate(SVUIA_ACTIVATE_FOCUS), S_OK);
   EXPECT_EQ(Last()->UIActivate(SVUIA_ACTIVATE_FOCUS), S_OK);
   EXPECT_EQ(Last()->UIActivate(SVUIA_DEACTIVATE), S_OK);
-  Open(Alpha().Get());
+  const std::wstring longest(kMaxStationNameLength, L'n');
+  SeedLevel(3, longest);
+  Open(Alpha(longest.c_str()).Get());
   Last()->UIActivate(SVUIA_ACTIVATE_NOFOCUS);
   EXPECT_EQ(browser_->status, (Texts{L"parts 1 -1", L"Marlix Digital Levels: \\Marlix Digital Levels",
-                                     L"parts 1 -1", L"Marlix Digital Levels: \\Marlix Digital Levels\\alpha"}));
+                                     L"parts 1 -1", L"Marlix Digital Levels: \\Marlix Digital Levels\\" + longest}));
 }
 
 TEST_F(View, ItemObjectIsOfTheFirstSelectedRowOrOfRowZero) {
@@ -365,13 +375,15 @@ TEST_F(View, ColumnClicksSortBothWaysForEveryViewWithTheAddRowFirst) {
   EXPECT_EQ(Rows(second), kRootRows) << "a refill sorts by the folder's order";
 }
 
-TEST_F(View, RefreshWhileTheThreadRunsStartsNoSecondThread) {
-  HWND view = Open(root_.Get());
-  for (int i = 0; i < 3; ++i) EXPECT_EQ(Last()->Refresh(), S_OK);
-  EXPECT_EQ(Rows(view), Texts{});
+// The thread has read the store and posted its result when a level comes and a refresh with it.
+TEST_F(View, ARefreshWhileTheThreadRunsShowsWhatCameMeanwhile) {
+  HWND view = Open(root_.Get(), FVM_DETAILS, nullptr, nullptr, false);
+  MSG posted;
+  ASSERT_TRUE(ui::WaitFor([&] { return PeekMessageW(&posted, view, GetEnumIDListMessage, GetEnumIDListMessage, PM_NOREMOVE); }));
+  SeedLevel(3, L"Delta");
+  EXPECT_EQ(Last()->Refresh(), S_OK);
   ASSERT_TRUE(PumpUntil([&] { return !AnimationOf(view); }));
-  PumpUntil([] { return false; }, 200);
-  EXPECT_EQ(Rows(view), kRootRows);
+  EXPECT_EQ(Rows(view), (Texts{L"Add New Digital Level", L"alpha", L"Bravo", L"Charlie", L"Delta"}));
 }
 
 // The thread's enumeration fails when memory runs out.
@@ -400,14 +412,18 @@ TEST_F(View, AViewWithoutAFolderOpensEmpty) {
   EXPECT_EQ(view->Refresh(), S_OK);
 }
 
+// A window made again for the same view fills again.
 TEST_F(View, AViewClosedWhileItsThreadRunsLeavesNothingBehind) {
   int threads = ThreadCount();
+  com::ComPtr<IShellView> view;
+  ASSERT_EQ(root_->CreateViewObject(nullptr, IID_IShellView, view.PutVoid()), S_OK);
   for (int i = 0; i < 20; ++i) {
-    HWND window = Open(root_.Get(), FVM_DETAILS, nullptr, nullptr, false);
-    ASSERT_TRUE(AnimationOf(window));
-    views_.back()->DestroyViewWindow();
-    views_.pop_back();
+    ASSERT_TRUE(AnimationOf(Show(view.Get(), FVM_DETAILS, nullptr, nullptr, false)));
+    view->DestroyViewWindow();
   }
+  EXPECT_EQ(Rows(Show(view.Get())), kRootRows);
+  view->DestroyViewWindow();
+  views_.clear(), view.Reset();
   EXPECT_TRUE(PumpUntil([&] { return com::ModuleLockCount() == before_ + 2; })) << "only folder and browser";
   EXPECT_TRUE(PumpUntil([&] { return ThreadCount() == threads; }));
 }
@@ -420,23 +436,6 @@ struct Resources {
   int threads;
   long handles, gdi, windows;
 
-  static long KernelHandles() {
-    using Query = LONG(WINAPI*)(ULONG, void*, ULONG, ULONG*);
-    auto query = reinterpret_cast<Query>(
-        reinterpret_cast<void*>(GetProcAddress(GetModuleHandleW(L"ntdll.dll"), "NtQuerySystemInformation")));
-    struct Entry { ULONG pid; BYTE type, flags; USHORT value; void* object; ULONG access; };
-    std::vector<BYTE> buffer(1 << 20);
-    ULONG size = 0;
-    while (query(16 /* SystemHandleInformation */, buffer.data(), static_cast<ULONG>(buffer.size()), &size) ==
-           static_cast<LONG>(0xC0000004))
-      buffer.resize(buffer.size() * 2);
-    ULONG count = *reinterpret_cast<ULONG*>(buffer.data());
-    auto* entries = reinterpret_cast<Entry*>(buffer.data() + sizeof(void*));
-    long mine = 0;
-    for (ULONG i = 0; i < count && sizeof(void*) + (i + 1) * sizeof(Entry) <= buffer.size(); ++i)
-      mine += entries[i].pid == GetCurrentProcessId();
-    return mine;
-  }
   static long GdiObjects() {
     struct Entry { UINT64 object; USHORT pid, count, unique; BYTE type, flags; UINT64 user; };
     static_assert(sizeof(Entry) == 24);
@@ -461,7 +460,7 @@ struct Resources {
     }, reinterpret_cast<LPARAM>(&count));
     return count;
   }
-  static Resources Now() { return {com::ModuleLockCount(), ThreadCount(), KernelHandles(), GdiObjects(), Windows()}; }
+  static Resources Now() { return {com::ModuleLockCount(), ThreadCount(), KernelHandleCount(), GdiObjects(), Windows()}; }
 };
 
 TEST_F(View, AThousandOpenFillCloseCyclesLeakNothing) {
@@ -555,9 +554,11 @@ Texts Entries(HMENU menu) {
   return entries;
 }
 
-Texts Popup(HMENU bar, UINT id) {
+// The entries of the browser's popup `id` as it opens.
+Texts Popup(FakeBrowser* browser, UINT id) {
   MENUITEMINFOW item{sizeof(item), MIIM_SUBMENU};
-  if (!bar || !GetMenuItemInfoW(bar, id, FALSE, &item)) return {L"<no popup>"};
+  if (!browser->shown || !GetMenuItemInfoW(browser->shown, id, FALSE, &item)) return {L"<no popup>"};
+  SendMessageW(browser->frame, WM_INITMENUPOPUP, reinterpret_cast<WPARAM>(item.hSubMenu), 0);
   return Entries(item.hSubMenu);
 }
 
@@ -610,6 +611,8 @@ TEST_F(View, KeysCopyPasteAndDeleteAndTheBrowserSeesThemToo) {
   EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"Copy of Charlie", L"alpha"}));
   Select(view, 0);
   Select(view, 1);  // the add row and alpha
+  EXPECT_EQ(Key(shell, browser_->frame, VK_DELETE), S_FALSE);
+  EXPECT_EQ(Stored().size(), 4u) << "a key typed in another window of the browser is that window's";
   EXPECT_EQ(Key(shell, list, VK_DELETE), S_FALSE);
   EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"Copy of Charlie"})) << "alpha deleted without a question";
   OleSetClipboard(nullptr);
@@ -634,15 +637,36 @@ TEST_F(View, CopyingTheAddRowPutsTheFolderItselfOnTheClipboard) {
   OleSetClipboard(nullptr);
 }
 
-// Puts a "Marlix Total Stations" block of two levels on the clipboard as another process would.
+// Puts a "Marlix Total Stations" block on the clipboard as another process would.
 // What a paste makes of a damaged block is the store's rule, tested there.
-void ClipStations() {
-  CStationRecord a, b;
-  a.Name = L"One", b.Name = L"Two";
+void ClipStations(const std::vector<CStationRecord>& records) {
   ASSERT_TRUE(OpenClipboard(nullptr));
   EmptyClipboard();
-  SetClipboardData(RegisterClipboardFormatW(L"Marlix Total Stations"), PackStations({a, b}));
+  SetClipboardData(RegisterClipboardFormatW(L"Marlix Total Stations"), PackStations(records));
   CloseClipboard();
+}
+CStationRecord Record(const std::wstring& name, const std::wstring& note = L"") {
+  CStationRecord record;
+  record.Name = name, record.Manufacturer = note;
+  return record;
+}
+
+// Whatever another process packs, every level pasted can be listed and found again: the keys
+// under Levels and the rows are one set.
+TEST_F(View, APasteStoresOnlyWhatEveryRoadCanCarry) {
+  const std::wstring longest(kMaxStationNameLength, L'x');
+  ClipStations({Record(longest), Record(longest + L"x"), Record(L"Note", std::wstring(260, L'n')), Record(L"a\\b")});
+  HWND view = Open(root_.Get());
+  Command(view, kCmdPaste);
+  Command(view, kCmdPaste);
+  Refilled(view);
+  const Texts stored = Stored();
+  EXPECT_EQ(stored, (Texts{L"Bravo", L"Charlie", L"Copy of " + longest.substr(8), L"alpha", longest}));
+  Texts rows = Rows(view);
+  rows.erase(rows.begin());
+  std::sort(rows.begin(), rows.end());
+  EXPECT_EQ(rows, stored);
+  OleSetClipboard(nullptr);
 }
 
 TEST_F(View, DeleteAndPasteInALevelsViewChangeNothingYetEveryViewOfALevelReloads) {
@@ -657,7 +681,7 @@ TEST_F(View, DeleteAndPasteInALevelsViewChangeNothingYetEveryViewOfALevelReloads
   Select(first, 0);
   Command(first, kCmdDelete);
   EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"alpha"}));
-  ClipStations();
+  ClipStations({Record(L"One"), Record(L"Two")});
   Command(first, kCmdPaste);
   EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"alpha"})) << "levels are pasted in the root only";
   OleSetClipboard(nullptr);
@@ -682,32 +706,28 @@ TEST_F(View, MergedMenusHoldTheEntriesInTheirOrderAndStatesFreshAtEachOpening) {
   HWND view = Open(root_.Get());
   ParkCursorAwayFrom(view);
   ASSERT_EQ(Last()->UIActivate(SVUIA_ACTIVATE_FOCUS), S_OK);
-  HMENU bar = browser_->shown;
-  EXPECT_EQ(Popup(bar, FCIDM_MENU_FILE), (Texts{L"-", L"Delete grey", L"Properties grey", L"Open default grey",
+  EXPECT_EQ(Popup(browser_.Get(), FCIDM_MENU_FILE), (Texts{L"-", L"Delete grey", L"Properties grey", L"Open default grey",
                                                 L"Create Digital Level", L"Close"}));
-  EXPECT_EQ(Popup(bar, FCIDM_MENU_EDIT), (Texts{L"-", L"&Copy grey", L"&Paste grey"}));
-  EXPECT_EQ(Popup(bar, FCIDM_MENU_VIEW), (Texts{L"Status Bar", L"-", L"Large Icons", L"Small Icons", L"List",
+  EXPECT_EQ(Popup(browser_.Get(), FCIDM_MENU_EDIT), (Texts{L"-", L"&Copy grey", L"&Paste grey"}));
+  EXPECT_EQ(Popup(browser_.Get(), FCIDM_MENU_VIEW), (Texts{L"Status Bar", L"-", L"Large Icons", L"Small Icons", L"List",
                                                 L"Details checked", L"-", L"Options"}));
   Select(view, 2);
-  SendMessageW(view, WM_INITMENUPOPUP, 0, 0);
-  bar = browser_->shown;
-  EXPECT_EQ(Popup(bar, FCIDM_MENU_FILE)[1], L"Delete");
-  EXPECT_EQ(Popup(bar, FCIDM_MENU_FILE)[3], L"Open default");
-  EXPECT_EQ(Popup(bar, FCIDM_MENU_EDIT), (Texts{L"-", L"&Copy grey", L"&Paste"})) << "mouse not over a level";
+  EXPECT_EQ(Popup(browser_.Get(), FCIDM_MENU_FILE)[1], L"Delete");
+  EXPECT_EQ(Popup(browser_.Get(), FCIDM_MENU_FILE)[3], L"Open default");
+  EXPECT_EQ(Popup(browser_.Get(), FCIDM_MENU_EDIT), (Texts{L"-", L"&Copy grey", L"&Paste"})) << "mouse not over a level";
   RECT row{LVIR_BOUNDS};
   SendMessageW(ListOf(view), LVM_GETITEMRECT, 1, reinterpret_cast<LPARAM>(&row));
   POINT over{row.left + 5, (row.top + row.bottom) / 2};
   ClientToScreen(ListOf(view), &over);
   SetCursorPos(over.x, over.y);
   Command(view, kCmdList);
-  EXPECT_EQ(Popup(browser_->shown, FCIDM_MENU_EDIT)[1], L"&Copy") << "a mode change rebuilds too";
-  EXPECT_EQ(Popup(browser_->shown, FCIDM_MENU_VIEW)[4], L"List checked");
+  EXPECT_EQ(Popup(browser_.Get(), FCIDM_MENU_EDIT)[1], L"&Copy") << "a mode change rebuilds too";
+  EXPECT_EQ(Popup(browser_.Get(), FCIDM_MENU_VIEW)[4], L"List checked");
   Select(view, 0);
-  SendMessageW(view, WM_INITMENUPOPUP, 0, 0);
-  EXPECT_EQ(Popup(browser_->shown, FCIDM_MENU_FILE)[1], L"Delete grey") << "the add row selected";
+  EXPECT_EQ(Popup(browser_.Get(), FCIDM_MENU_FILE)[1], L"Delete grey") << "the add row selected";
   ParkCursorAwayFrom(view);
   Last()->UIActivate(SVUIA_ACTIVATE_NOFOCUS);
-  EXPECT_EQ(Popup(browser_->shown, FCIDM_MENU_EDIT), Texts{L"Undo"}) << "without focus the Edit menu is the browser's";
+  EXPECT_EQ(Popup(browser_.Get(), FCIDM_MENU_EDIT), Texts{L"Undo"}) << "without focus the Edit menu is the browser's";
   Last()->UIActivate(SVUIA_DEACTIVATE);
   EXPECT_EQ(browser_->shown, nullptr);
 
@@ -716,9 +736,54 @@ TEST_F(View, MergedMenusHoldTheEntriesInTheirOrderAndStatesFreshAtEachOpening) {
   HWND file = Open(level.Get(), FVM_DETAILS, nullptr, dialog.Get());
   Select(file, 0);
   Last()->UIActivate(SVUIA_ACTIVATE_FOCUS);
-  EXPECT_EQ(Popup(dialog->shown, FCIDM_MENU_FILE), (Texts{L"Select default", L"Close"}));
-  EXPECT_EQ(Popup(dialog->shown, FCIDM_MENU_EDIT), (Texts{L"-", L"&Copy", L"&Paste grey"}))
+  EXPECT_EQ(Popup(dialog.Get(), FCIDM_MENU_FILE), (Texts{L"Select default", L"Close"}));
+  EXPECT_EQ(Popup(dialog.Get(), FCIDM_MENU_EDIT), (Texts{L"-", L"&Copy", L"&Paste grey"}))
       << "row 0 of a level is its file";
+}
+
+// A person opens File, Edit and View on the browser's menu bar with the mouse and chooses an
+// entry of each: the popups that open hold the view's entries, and what is chosen is done.
+TEST_F(View, EachMenuOpensWithTheViewsEntriesAndRunsWhatIsChosen) {
+  HWND view = Open(root_.Get());
+  SetWindowPos(browser_->frame, HWND_TOPMOST, 0, 0, 600, 400, SWP_SHOWWINDOW);
+  ASSERT_EQ(Last()->UIActivate(SVUIA_ACTIVATE_FOCUS), S_OK);
+  const auto choose = [&](int popup, UINT id) {
+    std::atomic<bool> done{false};
+    std::thread person([&] {
+      RECT box{};
+      GetMenuItemRect(browser_->frame, GetMenu(browser_->frame), popup, &box);
+      Mouse(MOUSEEVENTF_LEFTDOWN, {(box.left + box.right) / 2, (box.top + box.bottom) / 2});
+      Mouse(MOUSEEVENTF_LEFTUP, {(box.left + box.right) / 2, (box.top + box.bottom) / 2});
+      HWND opened = nullptr;
+      int at = -1;
+      ui::WaitFor([&] {
+        HMENU menu = (opened = FindWindowW(L"#32768", nullptr)) && IsWindowVisible(opened)
+                         ? reinterpret_cast<HMENU>(SendMessageW(opened, MN_GETHMENU, 0, 0)) : nullptr;
+        for (int i = 0; menu && i < GetMenuItemCount(menu); ++i)
+          if (GetMenuItemID(menu, i) == id && GetMenuItemRect(nullptr, menu, i, &box)) at = i;
+        return at >= 0;
+      });
+      if (at >= 0) Mouse(MOUSEEVENTF_LEFTDOWN, {(box.left + box.right) / 2, (box.top + box.bottom) / 2});
+      if (at >= 0) Mouse(MOUSEEVENTF_LEFTUP, {(box.left + box.right) / 2, (box.top + box.bottom) / 2});
+      else SendMessageTimeoutW(browser_->frame, kEndMenu, 0, 0, SMTO_BLOCK, 5000, nullptr);
+      done = true;
+    });
+    PumpUntil([&] { return done.load(); }, 15000);
+    person.join();
+  };
+  Select(view, 1);
+  Command(view, kCmdCopy);
+  choose(1, kCmdPaste);
+  EXPECT_TRUE(PumpUntil([] { return Stored() == Texts{L"Bravo", L"Charlie", L"Copy of alpha", L"alpha"}; }))
+      << "Edit, Paste";
+  Refilled(view);
+  choose(2, kCmdLargeIcons);
+  EXPECT_TRUE(PumpUntil([&] { return Mode(Last()) == 1u; })) << "View, Large Icons";
+  Select(view, 3);
+  choose(0, kCmdDelete);
+  EXPECT_TRUE(PumpUntil([] { return Stored() == Texts{L"Bravo", L"Copy of alpha", L"alpha"}; })) << "File, Delete";
+  SetWindowPos(browser_->frame, HWND_NOTOPMOST, 0, 0, 0, 0, SWP_NOMOVE | SWP_NOSIZE | SWP_HIDEWINDOW);
+  OleSetClipboard(nullptr);
 }
 
 // Reads the context menu while it is open, from a second thread, and closes it.
@@ -849,60 +914,5 @@ TEST_F(View, AnotherProcessSeesChangesByTheBroadcastAloneAndPastesWhatWasCopiedH
   OleSetClipboard(nullptr);
 }
 
-
-// What a surveyor does: presses the mouse on file1.tkf in a level's view, moves to a
-// window of another process that takes virtual files as Explorer does, and lets go.
-// The download runs here, inside the drag; the file lands there.
-TEST_F(View, DraggingTheFileToAnotherProcessDownloadsItThere) {
-  auto level = Alpha();
-  HWND view = Open(level.Get());
-  // Away from the screen's middle, where other programs' dialogs come up.
-  SetWindowPos(browser_->frame, HWND_TOPMOST, 0, 600, 600, 400, SWP_SHOWWINDOW);
-  const std::wstring folder = TempDir() + L"dropped";
-  CreateDirectoryW(folder.c_str(), nullptr);
-  wchar_t exe[MAX_PATH] = {};
-  GetModuleFileNameW(nullptr, exe, MAX_PATH);
-  std::wstring receiverExe = exe;
-  receiverExe = receiverExe.substr(0, receiverExe.find_last_of(L'\\')) + L"\\..\\bin\\shell_peer.exe";
-  HANDLE receiver = Start(L"\"" + receiverExe + L"\" drop \"" + folder + L"\" 1000 100 60");
-  ASSERT_TRUE(receiver);
-  RECT row{LVIR_LABEL};
-  SendMessageW(ListOf(view), LVM_GETITEMRECT, 0, reinterpret_cast<LPARAM>(&row));
-  POINT from{row.left + 10, (row.top + row.bottom) / 2}, to{1100, 175};
-  ASSERT_TRUE(PumpUntil([&] {
-    DWORD owner = 0;
-    GetWindowThreadProcessId(WindowFromPoint(to), &owner);
-    return owner == GetProcessId(receiver);
-  }, 20000)) << "the receiver's window is up";
-  ClientToScreen(ListOf(view), &from);
-  DialogDriver driver(IDC_TRANSFER_START, {}, 60000);
-  std::thread hand([&] {
-    Mouse(0, from);
-    Sleep(200);
-    Mouse(MOUSEEVENTF_LEFTDOWN, from);
-    for (int dx : {4, 8, 12}) {  // past the list's drag threshold while still inside it
-      Sleep(50);
-      Mouse(0, {from.x + dx, from.y});
-    }
-    for (int i = 1; i <= 20; ++i) {
-      Sleep(50);
-      Mouse(0, {from.x + (to.x - from.x) * i / 20, from.y + (to.y - from.y) * i / 20});
-    }
-    Sleep(200);
-    Mouse(MOUSEEVENTF_LEFTUP, to);
-  });
-  DWORD code = WaitServing(receiver, 60);
-  hand.join();
-  CloseHandle(receiver);
-  EXPECT_TRUE(driver.Finish()) << "the download dialog came up and Start was pressed";
-  EXPECT_EQ(code, 0u) << "the receiver wrote every file it was offered";
-  std::vector<char> bytes;
-  if (FILE* file = _wfopen((folder + L"\\file1.tkf").c_str(), L"rb")) {
-    for (int c; (c = std::fgetc(file)) != EOF;) bytes.push_back(static_cast<char>(c));
-    std::fclose(file);
-  }
-  EXPECT_TRUE(IsStandInJob(bytes)) << bytes.size() << " bytes";
-  SetWindowPos(browser_->frame, HWND_NOTOPMOST, 0, 0, 0, 0, SWP_NOMOVE | SWP_NOSIZE | SWP_HIDEWINDOW);
-}
 
 }  // namespace

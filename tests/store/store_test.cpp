@@ -6,7 +6,6 @@
 #include "helpers/win_handles.h"
 #include "store/pidl_manager.h"
 #include "store/station_record.h"
-#include "store/string_table.h"
 #include "support/registry_sandbox.h"
 #include <sddl.h>  // after <windows.h>
 namespace {
@@ -129,13 +128,36 @@ TEST_F(Store, NumbersFillGapsNamesCountCaseAndDeleteTakesTheTree) {
   ASSERT_EQ(FindStation(found), S_OK);
   EXPECT_TRUE(Fields(found) == Fields(a));
 }
-TEST_F(Store, NamesAtAndPastTheReadLimitAndLockedLevels) {
-  ASSERT_EQ(Add(std::wstring(259, L'a')), S_OK);
-  EXPECT_EQ(Find(std::wstring(259, L'a')), S_OK);
-  ASSERT_EQ(Add(std::wstring(260, L'b')), S_OK);
-  EXPECT_EQ(Find(std::wstring(260, L'b')), E_FAIL) << "260 characters need 522 bytes: never matched";
-  ASSERT_EQ(Add(std::wstring(260, L'b')), S_OK);
-  EXPECT_TRUE(RegKeyExists(kUser, LevelPath(2)));
+TEST_F(Store, OnlyWhatReadsBackWholeIsWrittenAndLockedLevels) {
+  const std::wstring longest(kMaxStationNameLength, L'a'), note(kMaxStationTextLength, L'n');
+  CStationRecord full = Full(longest, 3);
+  full.Manufacturer = note;
+  ASSERT_EQ(AddStation(full), S_OK);
+  CStationRecord found = Named(longest);
+  ASSERT_EQ(FindStation(found), S_OK);
+  EXPECT_TRUE(Fields(found) == Fields(full)) << "the longest name and note read back, and the fields after them";
+  const std::tuple<std::wstring, std::wstring, std::wstring> unstorable[] = {  // name, note, model
+      {longest + L"a", L"", L""},
+      {L"", L"", L""},
+      {L"a\\b", L"", L""},
+      {L"a/b", L"", L""},
+      {L"n", note + L"n", L""},
+      {L"m", L"", note + L"m"},
+  };
+  for (const auto& [name, text, model] : unstorable) {
+    CStationRecord bad = Named(name);
+    bad.Manufacturer = text, bad.Model = model;
+    EXPECT_EQ(AddStation(bad), kUnstorableStation) << testing::PrintToString(name);
+    EXPECT_EQ(UpdateStation(longest, bad), kUnstorableStation) << testing::PrintToString(name);
+  }
+  EXPECT_FALSE(RegKeyExists(kUser, LevelPath(1))) << "no key is left behind";
+  EXPECT_EQ(NameAt(0), longest) << "and no rename happened";
+  const std::wstring copy = L"Copy of " + longest.substr(0, kMaxStationNameLength - 8);
+  EXPECT_EQ(FreeCopyName(longest, L"Copy of "), copy) << "cut to the longest name";
+  ASSERT_EQ(Add(copy), S_OK);
+  EXPECT_EQ(FreeCopyName(longest, L"Copy of ").substr(0, 16), L"Copy of Copy of ");
+  ASSERT_EQ(Add(L"x"), S_OK);
+  EXPECT_EQ(FreeCopyName(L"x", L""), L"") << "a name the prefix can't change: none";
   RegWriteString(kUser, LevelPath(5), L"Name", L"locked");
   win::UniqueHKey locked;
   ASSERT_EQ(RegOpenKeyExW(kUser, LevelPath(5).c_str(), 0, KEY_ALL_ACCESS, locked.Put()), ERROR_SUCCESS);
@@ -145,9 +167,9 @@ TEST_F(Store, NamesAtAndPastTheReadLimitAndLockedLevels) {
   EXPECT_EQ(RegSetKeySecurity(locked.Get(), DACL_SECURITY_INFORMATION, sd), ERROR_SUCCESS);
   LocalFree(sd);
   EXPECT_EQ(Find(L"locked"), E_FAIL) << "a level key that refuses full access is passed over";
-  std::wstring full(260, L'd');
-  WriteRaw(LevelPath(10), L"Name", REG_BINARY, full.data(), 520);
-  EXPECT_EQ(Find(full), S_OK) << "520 bytes with no terminator, and an odd size, still end inside the buffer";
+  std::wstring unterminated(260, L'd');
+  WriteRaw(LevelPath(10), L"Name", REG_BINARY, unterminated.data(), 520);
+  EXPECT_EQ(Find(unterminated), S_OK) << "520 bytes with no terminator, and an odd size, still end inside the buffer";
   WriteRaw(LevelPath(11), L"Name", REG_BINARY, L"odd!", 5);
   EXPECT_EQ(Find(L"od"), E_FAIL);
   EXPECT_EQ(Find(L"odd"), S_OK);
@@ -199,112 +221,5 @@ TEST(PackedStations, DamagedBlocksYieldOnlyTheWholeRecordsBefore) {
   std::vector<BYTE> open(bytes.begin(), bytes.end() - 10);  // a last string without its terminator
   open.insert(open.end(), {'x', 0, 1, 1, 1, 1, 1, 1, 1, 1});
   EXPECT_EQ(Unpacked(open).size(), 1u);
-}
-// Every text of the table, exactly: the English sentences are the keys of translations.
-#define HRA_STEPS \
-  L"1. Press the 'Menu' button\r\n" \
-  L"2. Select the <JOB> setting mode and press the 'Enter' button\r\n" \
-  L"3. Use down and left arrows to select <Output> and press the 'Enter' button\r\n" \
-  L"4. Select the job you wish to send using the Down and Left arrows and press the 'Enter' button\r\n" \
-  L"5. Use down and left arrows to select <TKF2x> format\r\n" \
-  L"6. Click Start in the 'Download from Digital Level' dialog box\r\n"
-const wchar_t kHra20[] = HRA_STEPS L"7. Press 'Enter' on HRA20 and this will start the download";
-const wchar_t kHra40[] = HRA_STEPS L"7. Press 'Enter' on HRA40 and this will start the download";
-const wchar_t kHrb1x[] =
-    L"1. Press 'F2' for menu\r\n"
-    L"2. Press '2' key for Management\r\n"
-    L"3. Press '1' key for Job\r\n"
-    L"4. Press '3' key for Comms output\r\n"
-    L"5. Use right and left arrows to select TKF2x format\r\n"
-    L"6. Check that <Com. locat.> is set to <Com>\r\n"
-    L"7. Press F4 'OK' on HRB1X\r\n"
-    L"8. Select the job you wish to send using up and down arrows\r\n"
-    L"9. Click Start in the 'Download from Digital Level' dialog box\r\n"
-    L"10. Press 'Enter' on HRB1X and this will start the download";
-const std::pair<UINT, const wchar_t*> kStrings[] = {
-    {270, L"%d bytes"},
-    {271, L"%.1f KB"},
-    {272, L"%.1f MB"},
-    {273, L"%.1f GB"},
-    {350, L"Name:"},
-    {351, L"Note:"},
-    {352, L"Port:"},
-    {353, L"Model:"},
-    {354, L"Baudrate:"},
-    {355, L"Parity:"},
-    {356, L"Data bits:"},
-    {357, L"Stop bits:"},
-    {358, L"TKF format:"},
-    {359, L"Status:"},
-    {360, L"File name:"},
-    {361, L"General"},
-    {362, L"Advanced"},
-    {363, L"Flow control:"},
-    {364, L"Checksum:"},
-    {1000, L"Add New Digital Level"},
-    {1001, L"Marlix Digital Levels"},
-    {1002, L"Create Digital Level"},
-    {1003, L"Delete"},
-    {1004, L"Properties"},
-    {1005, L"Large Icons"},
-    {1006, L"Small Icons"},
-    {1007, L"List"},
-    {1008, L"Details"},
-    {1009, L"Name"},
-    {1010, L"&Copy"},
-    {1011, L"&Paste"},
-    {1012, L"Finishing download..."},
-    {1013, L"Waiting for start..."},
-    {1014, L"Performing file transfer - %d%% done"},
-    {1015, L"None"},
-    {1016, L"Odd"},
-    {1017, L"Even"},
-    {1018, L"Copy of "},
-    {1022, L"New digital level"},
-    {1023, L"The digital level '%s' already exists"},
-    {1024, L"Digital Level's name can not contain folowing symbols:\n\t\t\\*/"},
-    {1025, L"Please enter valid device name!"},
-    {1026, L"Digital Level properties"},
-    {1027, L"Downloading..."},
-    {1028, L"Select"},
-    {1029, L"Open"},
-    {1030, L"Start"},
-    {1031, L"Cancel"},
-    {1032, L"File is in unknown format. Do you want to upload it?"},
-    {1033, L"TKF 20"},
-    {1034, L"TKF 33"},
-    {1036, L"None"},
-    {1037, L"Xon/Xoff"},
-    {1038, L"Not set"},
-    {1039, L"Set"},
-    {1040, L"Terminating connection..."},
-    {1041, L"Temporary file open error"},
-    {1042, L"Point name or memo is wrong"},
-    {1043, L"Uploading..."},
-    {1044, L"Unable to create file for saving"},
-    {1045, L"The checksum is incorrect"},
-    {1046, L"No error"},
-    {1047, L"HRA20"},
-    {1048, L"HRA40"},
-    {1049, L"HRB1X"},
-    {1050, kHra20},
-    {1051, kHra40},
-    {1052, kHrb1x},
-    {1053, L"Waiting for download..."},
-    {1103, L"The waiting time of the data has expired."},
-    {1104, L"The communication's process is interrupted by the user"},
-    {1105, L"The file you are trying to upload is to big! (more than %s)"},
-    {1106, L"Download file from Digital Level"},
-    {1109, L"Unable to set file path"},
-    {1110, L"Unable to set timeout"},
-    {1111, L"Unable to set points"},
-    {1112, L"Unable to set communication parameters"},
-    {1113, L"Unable to receive file"},
-    {1114, L"Unknown error"},
-    {2010, L"Can not open COM port. Port is already open by another program"},
-};
-TEST(StringTable, EveryTextExactly) {
-  static_assert(std::size(kStrings) == 80);
-  for (const auto& [id, expected] : kStrings) EXPECT_EQ(LoadTranslatedString(id), expected) << id;
 }
 }  // namespace

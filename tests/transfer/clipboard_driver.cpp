@@ -1,6 +1,7 @@
-// Two processes and the real OLE clipboard. The driver puts a level's file on the clipboard,
-// starts the file receiver, which pastes it as Explorer would, and works its own download
-// dialog meanwhile; then it checks the bytes the receiver wrote and that no file stays.
+// Two processes and the real OLE clipboard. The driver puts the file of a level with the longest
+// name on the clipboard, starts the file receiver, which pastes it as Explorer would, and works
+// its own download dialog meanwhile; then it checks the bytes the receiver wrote and that no
+// file stays.
 #include <windows.h>
 #include <ole2.h>
 #include <process.h>
@@ -25,12 +26,12 @@ int Fail(const char* what, long code = 0) {
 int Owner(const wchar_t* receiver) {
   RegistrySandbox sandbox;
   CStationRecord level;
-  level.Name = L"Clip";
+  level.Name = std::wstring(kMaxStationNameLength, L'c');  // the road at the longest name
   if (AddStation(level) != S_OK) return Fail("AddStation");
   const std::set<std::wstring> before = TransferFiles();
   {
     auto data = com::Make<CMarlixDLDataObject>();
-    data->AddItem(win::UniqueCoMem<ITEMIDLIST>(MakeFullList(L"Clip", true)).Get());
+    data->AddItem(win::UniqueCoMem<ITEMIDLIST>(MakeFullList(level.Name, true)).Get());
     if (HRESULT hr = OleSetClipboard(data.Get()); FAILED(hr)) return Fail("OleSetClipboard", hr);
   }  // the clipboard holds the only reference now
   DialogDriver driver(220, {}, 60000);

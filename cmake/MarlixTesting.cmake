@@ -3,11 +3,15 @@ set(INSTALL_GTEST OFF CACHE BOOL "" FORCE)
 set(BUILD_GMOCK ON CACHE BOOL "" FORCE)
 add_subdirectory(/usr/src/googletest ${CMAKE_BINARY_DIR}/googletest EXCLUDE_FROM_ALL SYSTEM)
 
-# One throwaway Wine prefix per build tree, made once per test run (about 10 s).
+# One throwaway Wine prefix per build tree, made once (about 10 s). Its daemons run from the
+# first test to the last, apart from every test's output (see scripts/wine-daemons).
 set(MARLIX_WINEPREFIX ${CMAKE_BINARY_DIR}/wineprefix)
 set(MARLIX_WINE_RUN ${CMAKE_SOURCE_DIR}/scripts/wine-run)
-add_test(NAME wine_prefix COMMAND ${CMAKE_SOURCE_DIR}/scripts/wine-prefix ${MARLIX_WINEPREFIX})
+set(MARLIX_WINE_DAEMONS ${CMAKE_SOURCE_DIR}/scripts/wine-daemons)
+add_test(NAME wine_prefix COMMAND ${MARLIX_WINE_DAEMONS} ${MARLIX_WINEPREFIX})
+add_test(NAME wine_prefix_stop COMMAND ${MARLIX_WINE_DAEMONS} --stop ${MARLIX_WINEPREFIX})
 set_tests_properties(wine_prefix PROPERTIES FIXTURES_SETUP wine TIMEOUT 300)
+set_tests_properties(wine_prefix_stop PROPERTIES FIXTURES_CLEANUP wine TIMEOUT 60)
 
 add_library(marlix_test_support STATIC
   ${CMAKE_SOURCE_DIR}/tests/support/test_main.cpp

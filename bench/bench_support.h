@@ -10,7 +10,7 @@
 #include <string>
 #include <vector>
 
-#include "server/com_base.h"
+#include "base/com_base.h"
 #include "store/station_record.h"
 
 namespace bench {

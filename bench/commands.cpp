@@ -25,18 +25,18 @@ using Clock = std::chrono::steady_clock;
 
 using bench::Browser;
 
-CStationRecord Level(const std::wstring& name) {
+CStationRecord NamedRecord(const std::wstring& name) {
   CStationRecord record;
   record.Name = name;
   return record;
 }
 
-void Reset(int count) {
+void ReseedLevels(int count) {
   RegDeleteTreeW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str());
   bench::SeedLevels(count);
 }
 
-void Pump(const std::function<bool()>& done) {
+void PumpUntil(const std::function<bool()>& done) {
   while (!done()) {
     MsgWaitForMultipleObjects(0, nullptr, FALSE, 1, QS_ALLINPUT);
     MSG msg;
@@ -53,7 +53,7 @@ bool Filled(HWND list, int rows) {
 void Settle(HWND list, int rows) {
   for (int i = 0; i < 3; ++i) {
     Sleep(30);
-    Pump([&] { return Filled(list, rows); });
+    PumpUntil([&] { return Filled(list, rows); });
   }
 }
 
@@ -79,7 +79,7 @@ size_t Enumerate(IShellFolder* folder) {
 
 void ClipLevels(int count) {
   std::vector<CStationRecord> records;
-  for (int i = 0; i < count; ++i) records.push_back(Level(L"Pasted " + std::to_wstring(i)));
+  for (int i = 0; i < count; ++i) records.push_back(NamedRecord(L"Pasted " + std::to_wstring(i)));
   HGLOBAL block = PackStations(records);
   OpenClipboard(nullptr);
   EmptyClipboard();
@@ -105,7 +105,7 @@ int main() {
     HWND window = nullptr;
 
     const int levels = 10000, rounds = 5;
-    Reset(levels);
+    ReseedLevels(levels);
     view->CreateViewWindow(nullptr, &settings, browser.Get(), &rect, &window);
     HWND list = GetDlgItem(window, kListWindowId);
     Settle(list, levels + 1);
@@ -119,11 +119,11 @@ int main() {
       SendMessageW(list, LVM_SETITEMSTATE, 1, reinterpret_cast<LPARAM>(&select));
       auto start = Clock::now();
       SendMessageW(window, WM_COMMAND, kCmdDelete, 0);
-      Pump([&] { return Filled(list, left); });
+      PumpUntil([&] { return Filled(list, left); });
       command.push_back(Since(start));
       Settle(list, left);
       start = Clock::now();
-      DeleteStation(Level(L"Level " + std::to_wstring(1001 + i)));
+      DeleteStation(NamedRecord(L"Level " + std::to_wstring(1001 + i)));
       size_t seen = Enumerate(folder.Get());
       bare.push_back(Since(start));
       left -= 2;
@@ -137,19 +137,19 @@ int main() {
     const int pasted = 100, base = 10;
     command.clear(), bare.clear();
     for (int i = 0; i < rounds; ++i) {
-      Reset(base);
+      ReseedLevels(base);
       view->Refresh();
       Settle(list, base + 1);
       ClipLevels(pasted);
       auto start = Clock::now();
       SendMessageW(window, WM_COMMAND, kCmdPaste, 0);
-      Pump([&] { return Filled(list, base + pasted + 1); });
+      PumpUntil([&] { return Filled(list, base + pasted + 1); });
       command.push_back(Since(start));
       Settle(list, base + pasted + 1);
-      Reset(base);
+      ReseedLevels(base);
       start = Clock::now();
       for (int n = 0; n < pasted; ++n) {
-        CStationRecord record = Level(L"Pasted " + std::to_wstring(n));
+        CStationRecord record = NamedRecord(L"Pasted " + std::to_wstring(n));
         AddStation(record);
       }
       bare.push_back(Since(start));

@@ -10,7 +10,7 @@
 #include <thread>
 #include <vector>
 
-#include "server/com_base.h"
+#include "base/com_base.h"
 #include "store/pidl_manager.h"
 #include "store/station_record.h"
 #include "transfer/data_object.h"

@@ -7,8 +7,8 @@
 #include <shlwapi.h>
 
 #include "base/resource_ids.h"
-#include "helpers/win_handles.h"
-#include "server/dialog_base.h"
+#include "base/win_handles.h"
+#include "base/dialog_base.h"
 #include "store/string_table.h"
 
 namespace {
@@ -108,11 +108,10 @@ void CStationGeneralPage::DoDataExchange(bool toControls) {
   CPropertyPage::DoDataExchange(toControls);
   PortList.Attach(Item(IDC_STATION_PORT));
   ModelList.Attach(Item(IDC_STATION_MODEL));
-  HWND page = Handle();
-  ddx::Text(page, toControls, IDC_STATION_NAME, NameText);
-  ddx::Text(page, toControls, IDC_STATION_NOTE, NoteText);
-  ddx::ComboExact(page, toControls, IDC_STATION_PORT, PortText);
-  ddx::ComboExact(page, toControls, IDC_STATION_MODEL, ModelText);
+  DdxText(toControls, IDC_STATION_NAME, NameText);
+  DdxText(toControls, IDC_STATION_NOTE, NoteText);
+  DdxComboExact(toControls, IDC_STATION_PORT, PortText);
+  DdxComboExact(toControls, IDC_STATION_MODEL, ModelText);
   if (toControls) return;
   Record->Name = NameText;
   Record->Manufacturer = NoteText;
@@ -174,13 +173,12 @@ void CStationAdvancedPage::DoDataExchange(bool toControls) {
   StopBitsList.Attach(Item(IDC_STATION_STOPBITS));
   FlowList.Attach(Item(IDC_STATION_FLOW));
   CheckSumList.Attach(Item(IDC_STATION_CHECKSUM));
-  HWND page = Handle();
-  ddx::ComboPrefix(page, toControls, IDC_STATION_PARITY, ParityText);
-  ddx::ComboPrefix(page, toControls, IDC_STATION_BAUD, BaudText);
-  ddx::ComboPrefix(page, toControls, IDC_STATION_DATABITS, DataBitsText);
-  ddx::ComboPrefix(page, toControls, IDC_STATION_STOPBITS, StopBitsText);
-  ddx::ComboPrefix(page, toControls, IDC_STATION_FLOW, FlowText);
-  ddx::ComboPrefix(page, toControls, IDC_STATION_CHECKSUM, CheckSumText);
+  DdxComboPrefix(toControls, IDC_STATION_PARITY, ParityText);
+  DdxComboPrefix(toControls, IDC_STATION_BAUD, BaudText);
+  DdxComboPrefix(toControls, IDC_STATION_DATABITS, DataBitsText);
+  DdxComboPrefix(toControls, IDC_STATION_STOPBITS, StopBitsText);
+  DdxComboPrefix(toControls, IDC_STATION_FLOW, FlowText);
+  DdxComboPrefix(toControls, IDC_STATION_CHECKSUM, CheckSumText);
   if (toControls) return;
 
   Record->BaudRate = IntegerOf(BaudText);

@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "server/property_sheet.h"
+#include "base/property_sheet.h"
 #include "store/station_record.h"
 
 // Appends the machine's serial port names (the data of HKLM\HARDWARE\DEVICEMAP\SERIALCOMM)

@@ -8,7 +8,7 @@
 
 #include "helpers/file_helpers.h"
 #include "marlix_version.h"
-#include "helpers/win_handles.h"
+#include "base/win_handles.h"
 
 namespace kld::ft {
 

@@ -6,8 +6,9 @@
 #include <new>
 #include <vector>
 
+#include "base/boundary.h"
+#include "base/win_handles.h"
 #include "helpers/errors_source.h"
-#include "store/string_table.h"
 
 namespace kld::ft {
 
@@ -72,18 +73,10 @@ constexpr CodeRow kCodeTable[] = {
     {0x000400C3, 4053}, {0x00040104, 4043}, {0x00040301, 4030}, {0x00040302, 4038},
 };
 
-// Takes over a buffer from FormatMessageW; `cut` drops the line end of table messages.
-std::wstring TakeMessage(wchar_t* buffer, DWORD length, bool cut) {
+// The message FormatMessageW wrote into `buffer`; `cut` drops the line end of table messages.
+std::wstring MessageText(const win::UniqueLocal& buffer, DWORD length, bool cut) {
   std::wstring text;
-  if (buffer && length) {
-    try {
-      text.assign(buffer, length);
-    } catch (...) {
-      LocalFree(buffer);
-      throw;
-    }
-  }
-  if (buffer) LocalFree(buffer);
+  if (buffer && length) text.assign(static_cast<const wchar_t*>(buffer.Get()), length);
   if (cut) text.resize(text.size() >= 2 ? text.size() - 2 : 0);
   return text;
 }
@@ -101,6 +94,13 @@ std::wstring TErrorReporter::GetErrorText(HRESULT, const wchar_t*, const wchar_t
   return {};
 }
 
+namespace {
+ErrorTextSource textSource = nullptr;
+std::wstring ErrorText(UINT id) { return textSource ? textSource(id) : std::wstring(); }
+}  // namespace
+
+void SetErrorTextSource(ErrorTextSource source) noexcept { textSource = source; }
+
 UINT TStdErrorReporter::StringIdOf(HRESULT code) noexcept {
   for (const CodeRow& row : kCodeTable) {
     if (row.code == static_cast<DWORD>(code)) return row.id;
@@ -111,7 +111,7 @@ UINT TStdErrorReporter::StringIdOf(HRESULT code) noexcept {
 std::wstring TStdErrorReporter::GetErrorText(HRESULT code, const wchar_t* text1,
                                              const wchar_t* text2, const wchar_t*) const {
   UINT id = StringIdOf(code);
-  std::wstring pattern = id ? LoadTranslatedString(id) : std::wstring();
+  std::wstring pattern = id ? ErrorText(id) : std::wstring();
   // Facility 4 is formatted from its template even when that is empty, which fails on
   // purpose: such codes must never reach the system's message table.
   const bool fromTemplate = !pattern.empty() || (static_cast<DWORD>(code) & 0x1FFF0000) == 0x40000;
@@ -121,33 +121,25 @@ std::wstring TStdErrorReporter::GetErrorText(HRESULT code, const wchar_t* text1,
   DWORD_PTR arguments[3] = {reinterpret_cast<DWORD_PTR>(first.c_str()),
                             reinterpret_cast<DWORD_PTR>(second.c_str()),
                             reinterpret_cast<DWORD_PTR>(third.c_str())};
-  wchar_t* buffer = nullptr;
-  DWORD length = StdReporterMessageSource(fromTemplate ? 0x2500 : 0x3100,
-                                fromTemplate ? pattern.c_str() : nullptr,
-                                static_cast<DWORD>(code), 0, reinterpret_cast<LPWSTR>(&buffer), 0,
-                                reinterpret_cast<va_list*>(arguments));
-  if (length == 0) {
-    if (buffer) LocalFree(buffer);
-    return {};
-  }
-  return TakeMessage(buffer, length, !fromTemplate);
+  win::UniqueLocal buffer;
+  DWORD length = StdReporterMessageSource(fromTemplate ? 0x2500 : 0x3100, fromTemplate ? pattern.c_str() : nullptr,
+                                          static_cast<DWORD>(code), 0, reinterpret_cast<LPWSTR>(buffer.Put()), 0,
+                                          reinterpret_cast<va_list*>(arguments));
+  if (length == 0) return {};
+  return MessageText(buffer, length, !fromTemplate);
 }
 
 std::wstring TInternetErrorReporter::GetErrorText(HRESULT code, const wchar_t*, const wchar_t*,
                                                   const wchar_t*) const {
   // Only asked when someone else has loaded the library; it is never loaded for this.
   // The reference taken here keeps it in the process while its table is read.
-  HMODULE wininet = nullptr;
-  if (!GetModuleHandleExW(0, L"wininet.dll", &wininet) || !wininet) return {};
-  wchar_t* buffer = nullptr;
-  DWORD length = FormatMessageW(0x0B00, wininet, static_cast<DWORD>(code) & 0x7FF8FFFF, 0,
-                                reinterpret_cast<LPWSTR>(&buffer), 0, nullptr);
-  FreeLibrary(wininet);
-  if (length == 0) {
-    if (buffer) LocalFree(buffer);
-    return {};
-  }
-  return TakeMessage(buffer, length, true);
+  win::UniqueLibrary wininet;
+  if (!GetModuleHandleExW(0, L"wininet.dll", wininet.Put()) || !wininet) return {};
+  win::UniqueLocal buffer;
+  DWORD length = FormatMessageW(0x0B00, wininet.Get(), static_cast<DWORD>(code) & 0x7FF8FFFF, 0,
+                                reinterpret_cast<LPWSTR>(buffer.Put()), 0, nullptr);
+  if (length == 0) return {};
+  return MessageText(buffer, length, true);
 }
 
 size_t ErrorReporterCount() noexcept { return reporters.count; }
@@ -158,13 +150,14 @@ const TErrorReporter* ErrorReporterAt(size_t index) noexcept {
 
 std::wstring BuildErrorText(HRESULT code, const wchar_t* text1, const wchar_t* text2,
                             const wchar_t* text3) {
-  std::wstring result;
-  try {
+  // Out of memory: no text, rather than an exception in the middle of reporting another fault.
+  return boundary::CallOr(std::wstring(), [&] {
+    std::wstring result;
     for (size_t i = 0; i < reporters.count; ++i) {
       result = reporters.items[i]->GetErrorText(code, text1, text2, text3);
       if (!result.empty()) return result;
     }
-    std::wstring format = LoadTranslatedString(4041);
+    std::wstring format = ErrorText(4041);
     if (format.empty()) format = L"# %lx";
     std::vector<wchar_t> buffer(format.size() + 64);
     for (;;) {
@@ -177,9 +170,8 @@ std::wstring BuildErrorText(HRESULT code, const wchar_t* text1, const wchar_t* t
       if (buffer.size() > 0x10000) break;  // a format that never fits
       buffer.resize(buffer.size() * 4);
     }
-  } catch (const std::bad_alloc&) {
-  }
-  return result;
+    return result;
+  });
 }
 
 // Brings the named error sources' map into every module that reports errors.

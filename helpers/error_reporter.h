@@ -42,6 +42,12 @@ using MessageSourceFn = DWORD(WINAPI*)(DWORD flags, LPCVOID source, DWORD code, 
                                        LPWSTR buffer, DWORD size, va_list* arguments);
 extern MessageSourceFn StdReporterMessageSource;
 
+// Where the texts of the code table and the fallback format come from: the module's string
+// table, which lies a layer above this library and is handed down when the module starts.
+// Until then every code has an empty template.
+using ErrorTextSource = std::wstring (*)(UINT id);
+void SetErrorTextSource(ErrorTextSource source) noexcept;
+
 // Never empty unless memory ran out.
 std::wstring BuildErrorText(HRESULT code, const wchar_t* text1 = nullptr,
                             const wchar_t* text2 = nullptr, const wchar_t* text3 = nullptr);

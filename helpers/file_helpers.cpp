@@ -1,7 +1,7 @@
 #include "helpers/file_helpers.h"
 
 #include "helpers/path_parts.h"
-#include "helpers/win_handles.h"
+#include "base/win_handles.h"
 
 namespace kld::ft {
 
@@ -58,10 +58,7 @@ bool FileExists(const wchar_t* path, bool openForReading) {
     return static_cast<bool>(file);
   }
   WIN32_FIND_DATAW data;
-  HANDLE find = FindFirstFileW(path, &data);
-  if (find == INVALID_HANDLE_VALUE) return false;
-  FindClose(find);
-  return true;
+  return static_cast<bool>(win::UniqueFind(FindFirstFileW(path, &data)));
 }
 
 bool CreateDirectoryPath(const wchar_t* path, LPSECURITY_ATTRIBUTES securityAttributes) {

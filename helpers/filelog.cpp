@@ -11,6 +11,8 @@
 #include <vector>
 
 #include "base/boundary.h"
+#include "base/com_base.h"
+#include "base/win_handles.h"
 #include "helpers/error_reporter.h"
 
 namespace kld::ft {
@@ -21,7 +23,7 @@ void (*BeforeFilelogRetry)() = nullptr;
 
 namespace {
 
-HANDLE logFile = INVALID_HANDLE_VALUE;
+win::UniqueFile logFile;
 std::string logPath;
 std::atomic<unsigned> outputMode{3};
 std::atomic<unsigned> logLevel{255};
@@ -70,28 +72,21 @@ std::wstring FormatW(const wchar_t* format, va_list args) {
 }
 
 std::wstring SystemDescription(HRESULT code) {
-  wchar_t* buffer = nullptr;
+  win::UniqueLocal buffer;
   DWORD length = FormatMessageW(FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_ALLOCATE_BUFFER |
                                     FORMAT_MESSAGE_IGNORE_INSERTS,
-                                nullptr, static_cast<DWORD>(code), 0,
-                                reinterpret_cast<LPWSTR>(&buffer), 0, nullptr);
-  std::wstring text(buffer && length ? std::wstring(buffer, length) : std::wstring());
-  if (buffer) LocalFree(buffer);
+                                nullptr, static_cast<DWORD>(code), 0, reinterpret_cast<LPWSTR>(buffer.Put()), 0, nullptr);
+  std::wstring text(buffer && length ? std::wstring(static_cast<const wchar_t*>(buffer.Get()), length) : std::wstring());
   text.resize(text.size() >= 2 ? text.size() - 2 : 0);
   return text;
 }
 
 std::wstring ErrorInfoDescription() {
-  IErrorInfo* info = nullptr;
-  if (GetErrorInfo(0, &info) != S_OK || !info) return {};
-  BSTR description = nullptr;
-  std::wstring text;
-  if (SUCCEEDED(info->GetDescription(&description)) && description) {
-    text.assign(description, SysStringLen(description));
-    SysFreeString(description);
-  }
-  info->Release();
-  return text;
+  com::ComPtr<IErrorInfo> info;
+  if (GetErrorInfo(0, info.Put()) != S_OK || !info) return {};
+  win::UniqueBstr description;
+  if (FAILED(info->GetDescription(description.Put())) || !description) return {};
+  return std::wstring(description.Get(), SysStringLen(description.Get()));
 }
 
 }  // namespace
@@ -117,7 +112,7 @@ std::string LogEntryPrefix() {
 }
 
 void WriteLogEntry(const std::string& prefix, const std::string& text) {
-  try {
+  boundary::CallVoid([&] {
     std::vector<std::string> lines;
     size_t begin = 0;
     while (begin < text.size()) {
@@ -134,17 +129,16 @@ void WriteLogEntry(const std::string& prefix, const std::string& text) {
     for (size_t i = 0; i < lines.size(); ++i) {
       const std::string line = lines[i] + "\r\n";
       if (mode & 1) {
-        WriteRaw(logFile, i == 0 ? prefix : indent);
-        WriteRaw(logFile, line);
+        WriteRaw(logFile.Get(), i == 0 ? prefix : indent);
+        WriteRaw(logFile.Get(), line);
       }
       if (mode & 4) WriteRaw(console, line);
     }
-  } catch (...) {
-  }
+  });
 }
 
 bool StartFilelog(const wchar_t* name, bool restart) {
-  if (logFile != INVALID_HANDLE_VALUE) {
+  if (logFile) {
     if (!restart) return false;
     StopFilelog();
   }
@@ -155,23 +149,23 @@ bool StartFilelog(const wchar_t* name, bool restart) {
 
   // The whole rotation: earlier logs of this name go, unless someone holds them open.
   WIN32_FIND_DATAW found;
-  HANDLE search = FindFirstFileW((folder + base + L"_*.log").c_str(), &found);
-  if (search != INVALID_HANDLE_VALUE) {
+  if (win::UniqueFind search(FindFirstFileW((folder + base + L"_*.log").c_str(), &found)); search) {
     do {
       DeleteFileW((folder + found.cFileName).c_str());
-    } while (FindNextFileW(search, &found));
-    FindClose(search);
+    } while (FindNextFileW(search.Get(), &found));
   }
   CreateDirectoryW(folder.c_str(), nullptr);
 
   const std::wstring path = folder + base + L"_" + std::to_wstring(GetCurrentProcessId()) + L".log";
-  logFile = CreateFileW(path.c_str(), GENERIC_WRITE, FILE_SHARE_READ, nullptr, CREATE_ALWAYS,
-                        FILE_ATTRIBUTE_NORMAL, nullptr);
-  if (logFile == INVALID_HANDLE_VALUE) {
+  const auto create = [&] {
+    logFile.Reset(CreateFileW(path.c_str(), GENERIC_WRITE, FILE_SHARE_READ, nullptr, CREATE_ALWAYS,
+                              FILE_ATTRIBUTE_NORMAL, nullptr));
+  };
+  create();
+  if (!logFile) {
     Sleep(1);
     if (test_only::BeforeFilelogRetry) test_only::BeforeFilelogRetry();
-    logFile = CreateFileW(path.c_str(), GENERIC_WRITE, FILE_SHARE_READ, nullptr, CREATE_ALWAYS,
-                          FILE_ATTRIBUTE_NORMAL, nullptr);
+    create();
   }
   logPath = NarrowText(path);
   return true;
@@ -179,8 +173,7 @@ bool StartFilelog(const wchar_t* name, bool restart) {
 
 void StopFilelog() {
   RestoreLogStreams();
-  if (logFile != INVALID_HANDLE_VALUE) CloseHandle(logFile);
-  logFile = INVALID_HANDLE_VALUE;
+  logFile.Reset();
 }
 
 std::string FilelogPath() { return logPath; }
@@ -202,7 +195,7 @@ void WriteLogText(const std::string& text) { WriteLogEntry(LogEntryPrefix(), tex
 void WriteLogText(const std::wstring& text) { WriteLogEntry(LogEntryPrefix(), NarrowText(text)); }
 
 void LogTextA(const char* format, ...) {
-  if (logFile == INVALID_HANDLE_VALUE) return;
+  if (!logFile) return;
   va_list args;
   va_start(args, format);
   boundary::CallVoid([&] { WriteLogEntry(LogEntryPrefix(), FormatA(format, args)); });
@@ -217,11 +210,11 @@ void LogTextW(const wchar_t* format, ...) {
 }
 
 void LogError(const char* file, int line, const wchar_t* text, HRESULT code, ...) {
-  try {
-    va_list args;
-    va_start(args, code);
-    std::wstring message = FormatW(text ? text : L"", args);
-    va_end(args);
+  va_list args;
+  va_start(args, code);
+  const std::wstring message = boundary::CallOr(std::wstring(), [&] { return FormatW(text ? text : L"", args); });
+  va_end(args);
+  boundary::CallVoid([&] {
     char head[64];
     std::snprintf(head, sizeof head, " - 0x%08X (", static_cast<unsigned>(code));
     std::string entry = NarrowText(message) + head + (file ? file : "") + ", " +
@@ -239,8 +232,7 @@ void LogError(const char* file, int line, const wchar_t* text, HRESULT code, ...
       if (!description.empty()) entry += label + NarrowText(description);
     }
     WriteLogEntry(LogEntryPrefix(), entry);
-  } catch (...) {
-  }
+  });
 }
 
 unsigned SetFilelogMode(unsigned mode) { return outputMode.exchange(mode); }

@@ -6,8 +6,9 @@
 #include <string>
 #include <vector>
 
+#include "base/boundary.h"
+#include "base/win_handles.h"
 #include "helpers/filelog.h"
-#include "helpers/win_handles.h"
 
 namespace kld::ft {
 
@@ -68,13 +69,11 @@ void WalkSuspended(HANDLE thread, CStackDumpHandler& handler) {
     if (frame.AddrReturn.Offset) addresses.push_back(frame.AddrReturn.Offset);
   }
   for (DWORD64 address : addresses) {
-    std::string place, symbol;
-    try {
+    std::string place, symbol = "<EX: no symbol>";
+    boundary::CallVoid([&] {
       place = ModuleText(process, address);
       symbol = SymbolText(process, address);
-    } catch (...) {
-      symbol = "<EX: no symbol>";
-    }
+    });
     handler.OnFrame(address, symbol.c_str(), place.c_str());
   }
   SymCleanup(process);

@@ -8,7 +8,7 @@
 
 #include "helpers/app_helpers.h"
 #include "helpers/filelog.h"
-#include "helpers/win_handles.h"
+#include "base/win_handles.h"
 
 namespace kld::ft {
 

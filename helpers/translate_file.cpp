@@ -1,8 +1,7 @@
 #include "helpers/translate_file.h"
 
-#include <new>
-
-#include "helpers/win_handles.h"
+#include "base/boundary.h"
+#include "base/win_handles.h"
 
 namespace kld::ft {
 
@@ -51,12 +50,10 @@ HRESULT CTranslateFile::Load(const wchar_t* path) {
   const auto* bytes = static_cast<const unsigned char*>(view.Get());
   if (bytes[0] != 0xFF || bytes[1] != 0xFE) return E_FAIL;
   const size_t count = (static_cast<size_t>(size.QuadPart) - 2) / sizeof(wchar_t);
-  try {
+  return boundary::Call([&] {
     Parse(reinterpret_cast<const wchar_t*>(bytes + 2), count);
-  } catch (const std::bad_alloc&) {
-    return E_OUTOFMEMORY;
-  }
-  return S_OK;
+    return S_OK;
+  });
 }
 
 void CTranslateFile::Parse(const wchar_t* text, size_t count) {

@@ -2,8 +2,7 @@
 
 #include <shlwapi.h>
 
-#include <new>
-
+#include "base/boundary.h"
 #include "helpers/app_helpers.h"
 #include "helpers/path_parts.h"
 
@@ -113,7 +112,8 @@ std::wstring TranslateText(const std::wstring& text, LANGID sourceLanguage, LANG
     std::swap(sourceLanguage, targetLanguage);
     reverse = true;
   }
-  try {
+  // Out of memory, the text stays as it came.
+  return boundary::CallOr(text, [&] {
     {
       ExclusiveLock lock(&managerLock);
       if (!managerCreated) {
@@ -128,9 +128,7 @@ std::wstring TranslateText(const std::wstring& text, LANGID sourceLanguage, LANG
       if (!translated.empty()) return translated;
     }
     return CutAtMarker(text);
-  } catch (const std::bad_alloc&) {
-    return text;
-  }
+  });
 }
 
 CTranslateFileManager* TranslateFileManagerIfCreated() noexcept { return manager.get(); }

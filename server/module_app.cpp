@@ -1,9 +1,11 @@
 #include "server/module_app.h"
 
-#include "server/class_ids.h"
+#include "base/class_ids.h"
 #include "base/module_instance.h"
+#include "helpers/error_reporter.h"
 #include "shell/item_services.h"
 #include "store/station_record.h"
+#include "store/string_table.h"
 
 namespace {
 CModuleApp theApp;
@@ -18,6 +20,7 @@ BOOL CModuleApp::InitInstance() {
   server_.Init(ModuleObjectMap(), ModuleInstance());
   if (!CAppBase::InitInstance()) return FALSE;
   resource_ = ModuleInstance();
+  kld::ft::SetErrorTextSource(LoadTranslatedString);
   LoadDisplaySettings();
   LoadImageLists();
   return TRUE;

@@ -1,8 +1,14 @@
 #include "server/object_map.h"
 
-#include "server/class_creators.h"
-#include "server/class_ids.h"
+#include "base/class_ids.h"
 #include "base/resource_ids.h"
+#include "shell/enum_id_list.h"
+#include "shell/extract_icon.h"
+#include "shell/query_info.h"
+#include "shell/shell_folder.h"
+#include "shell/shell_view.h"
+#include "transfer/data_object.h"
+#include "transfer/drop_target.h"
 
 namespace {
 const ObjectMapEntry kObjectMap[] = {

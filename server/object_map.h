@@ -3,7 +3,7 @@
 #include <windows.h>
 #include <span>
 
-using ClassCreator = HRESULT (*)(REFIID riid, void** ppv);
+using ClassCreator = HRESULT (*)(REFIID riid, void** ppv) noexcept;
 
 struct ObjectMapEntry {
   const CLSID* clsid;

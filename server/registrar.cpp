@@ -3,6 +3,8 @@
 #include <cstdint>
 #include <vector>
 
+#include "base/win_handles.h"
+
 namespace {
 
 enum class Op { Key, Replace, Open, Value };
@@ -89,10 +91,8 @@ bool Parse(std::wstring_view script, const std::wstring& modulePath, std::vector
 bool Gone(LSTATUS status) { return status == ERROR_FILE_NOT_FOUND || status == ERROR_PATH_NOT_FOUND; }
 
 LSTATUS CreateKey(HKEY root, const std::wstring& path) {
-  HKEY key = nullptr;
-  LSTATUS status = RegCreateKeyExW(root, path.c_str(), 0, nullptr, 0, KEY_WRITE, nullptr, &key, nullptr);
-  if (status == ERROR_SUCCESS) RegCloseKey(key);
-  return status;
+  win::UniqueHKey key;
+  return RegCreateKeyExW(root, path.c_str(), 0, nullptr, 0, KEY_WRITE, nullptr, key.Put(), nullptr);
 }
 
 LSTATUS DeleteTree(HKEY root, const std::wstring& path) {
@@ -124,12 +124,9 @@ LSTATUS Unregister(const Statement& st) {
       return ERROR_SUCCESS;
     case Op::Value: {
       if (st.ownedKey) return ERROR_SUCCESS;
-      HKEY key = nullptr;
-      LSTATUS status = RegOpenKeyExW(st.root, st.path.c_str(), 0, KEY_SET_VALUE, &key);
-      if (status == ERROR_SUCCESS) {
-        status = RegDeleteValueW(key, st.name.c_str());
-        RegCloseKey(key);
-      }
+      win::UniqueHKey key;
+      LSTATUS status = RegOpenKeyExW(st.root, st.path.c_str(), 0, KEY_SET_VALUE, key.Put());
+      if (status == ERROR_SUCCESS) status = RegDeleteValueW(key.Get(), st.name.c_str());
       return Gone(status) ? ERROR_SUCCESS : status;
     }
   }

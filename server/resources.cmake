@@ -23,7 +23,7 @@ add_custom_command(
   VERBATIM)
 add_custom_target(marlix_typelib DEPENDS ${MARLIX_TYPELIB} ${MARLIX_LEVEL_ICON_GROUP})
 # Every binary with module.rc links the core, so the type library exists before any of them.
-add_dependencies(marlix_core marlix_typelib)
+add_dependencies(marlix_base marlix_typelib)
 
 # Files that module.rc pulls in without #include, so that a change recompiles it.
 file(GLOB MARLIX_MODULE_RC_DEPENDS CONFIGURE_DEPENDS ${CMAKE_SOURCE_DIR}/server/*.rgs ${CMAKE_SOURCE_DIR}/base/resource_ids.h

@@ -3,8 +3,9 @@
 #include <string>
 
 #include "base/boundary.h"
+#include "base/class_ids.h"
+#include "base/win_handles.h"
 #include "server/class_factory.h"
-#include "server/class_ids.h"
 #include "server/registrar.h"
 #include "server/type_library.h"
 
@@ -59,12 +60,10 @@ HRESULT CServerModule::Register() const {
   HRESULT hr = RegisterModuleTypeLib(module_);
   if (FAILED(hr)) return hr;
 
-  HKEY key = nullptr;
-  if (RegCreateKeyExW(HKEY_CLASSES_ROOT, ShellFolderKeyText().c_str(), 0, nullptr, 0, KEY_WRITE, nullptr, &key,
-                      nullptr) == ERROR_SUCCESS) {
-    RegSetValueExW(key, L"Attributes", 0, REG_BINARY, kFolderAttributes, sizeof(kFolderAttributes));
-    RegCloseKey(key);
-  }
+  win::UniqueHKey key;
+  if (RegCreateKeyExW(HKEY_CLASSES_ROOT, ShellFolderKeyText().c_str(), 0, nullptr, 0, KEY_WRITE, nullptr, key.Put(),
+                      nullptr) == ERROR_SUCCESS)
+    RegSetValueExW(key.Get(), L"Attributes", 0, REG_BINARY, kFolderAttributes, sizeof(kFolderAttributes));
   return hr;
 }
 
@@ -82,9 +81,7 @@ void CServerModule::Unregister() const {
   // A value name with a path in it names nothing; this first removal never finds
   // anything and stays for compatibility with what earlier versions did.
   RegDeleteValueW(HKEY_CLASSES_ROOT, (keyText + L"\\Attributes").c_str());
-  HKEY key = nullptr;
-  if (RegOpenKeyExW(HKEY_CLASSES_ROOT, keyText.c_str(), 0, KEY_WRITE, &key) == ERROR_SUCCESS) {
-    RegDeleteValueW(key, L"Attributes");
-    RegCloseKey(key);
-  }
+  win::UniqueHKey key;
+  if (RegOpenKeyExW(HKEY_CLASSES_ROOT, keyText.c_str(), 0, KEY_WRITE, key.Put()) == ERROR_SUCCESS)
+    RegDeleteValueW(key.Get(), L"Attributes");
 }

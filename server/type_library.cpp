@@ -4,7 +4,7 @@
 
 #include <string>
 
-#include "server/com_base.h"
+#include "base/com_base.h"
 #include "server/registrar.h"
 
 namespace {

@@ -3,11 +3,11 @@
 #include <windows.h>
 #include <shlobj.h>
 
-#include "server/com_base.h"
+#include "base/com_base.h"
 
 class CMarlixDLContextMenu : public com::ComObject<IContextMenu> {
  public:
-  STDMETHODIMP QueryContextMenu(HMENU menu, UINT index, UINT first, UINT last, UINT flags) override;
-  STDMETHODIMP InvokeCommand(CMINVOKECOMMANDINFO* info) override;
-  STDMETHODIMP GetCommandString(UINT_PTR id, UINT type, UINT* reserved, CHAR* text, UINT size) override;
+  STDMETHODIMP QueryContextMenu(HMENU menu, UINT index, UINT first, UINT last, UINT flags) noexcept override;
+  STDMETHODIMP InvokeCommand(CMINVOKECOMMANDINFO* info) noexcept override;
+  STDMETHODIMP GetCommandString(UINT_PTR id, UINT type, UINT* reserved, CHAR* text, UINT size) noexcept override;
 };

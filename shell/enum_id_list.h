@@ -4,7 +4,9 @@
 #include <windows.h>
 #include <shlobj.h>
 
-#include "server/com_base.h"
+#include <memory>
+
+#include "base/com_base.h"
 #include "store/pidl_manager.h"
 
 // A singly linked list of item lists, nodes and items both from the task allocator.
@@ -15,12 +17,12 @@ class CEnumIDListImpl : public com::ComObject<IEnumIDList> {
   ~CEnumIDListImpl() override;
 
   // Appends and takes the item; false (the item stays the caller's) without a node.
-  bool AddToEnumList(LPITEMIDLIST item);
+  bool AddToEnumList(UniqueIdList& item);
 
-  STDMETHODIMP Next(ULONG count, LPITEMIDLIST* items, ULONG* fetched) override;
-  STDMETHODIMP Skip(ULONG count) override;
-  STDMETHODIMP Reset() override;
-  STDMETHODIMP Clone(IEnumIDList** result) override;
+  STDMETHODIMP Next(ULONG count, LPITEMIDLIST* items, ULONG* fetched) noexcept override;
+  STDMETHODIMP Skip(ULONG count) noexcept override;
+  STDMETHODIMP Reset() noexcept override;
+  STDMETHODIMP Clone(IEnumIDList** result) noexcept override;
 
  protected:
   struct Node {
@@ -28,11 +30,11 @@ class CEnumIDListImpl : public com::ComObject<IEnumIDList> {
     LPITEMIDLIST item;
   };
 
-  CGravonPidlManagerBase* m_pidlMgr;
-  IMalloc* m_malloc = nullptr;
-  Node* m_first = nullptr;
-  Node* m_last = nullptr;
-  Node* m_current = nullptr;
+  std::unique_ptr<CGravonPidlManagerBase> pidlMgr_;
+  com::ComPtr<IMalloc> malloc_;
+  Node* first_ = nullptr;
+  Node* last_ = nullptr;
+  Node* current_ = nullptr;
 };
 
 class CMarlixDLEnumIDList : public CEnumIDListImpl {
@@ -42,11 +44,14 @@ class CMarlixDLEnumIDList : public CEnumIDListImpl {
   // Builds the list for the folder at `path` (plain form) with SHCONTF `flags`.
   // *result is S_OK, or E_OUTOFMEMORY for any failure, and then this object has
   // released its own reference and is gone.
-  void Create(const wchar_t* path, DWORD flags, HRESULT* result);
+  void Create(const wchar_t* path, DWORD flags, HRESULT* result) noexcept;
 
  private:
   HRESULT Build(const wchar_t* path, DWORD flags);
   HRESULT AddLevels(const std::wstring& path);
 
-  CPidlMgr* m_marlixPidlMgr;
+  CPidlMgr* marlixPidlMgr_;
 };
+
+// The class object's creator: an empty enumerator.
+HRESULT CreateMarlixDLEnumIDList(REFIID riid, void** ppv) noexcept;

@@ -6,8 +6,8 @@
 #include "base/module_instance.h"
 #include "base/resource_ids.h"
 
-HIMAGELIST LargeImageList = nullptr;
-HIMAGELIST SmallImageList = nullptr;
+win::UniqueImageList LargeImageList;
+win::UniqueImageList SmallImageList;
 
 namespace {
 
@@ -18,23 +18,16 @@ HICON BlankIcon(int cx, int cy) {
   return CreateIcon(nullptr, cx, cy, 1, 1, andMask.data(), xorMask.data());
 }
 
-void BuildList(HINSTANCE module, HIMAGELIST& list, int cx, int cy) {
-  if (list) ImageList_Destroy(list);
-  list = ImageList_Create(cx, cy, ILC_COLOR32, 4, 0);
+void BuildList(HINSTANCE module, win::UniqueImageList& list, int cx, int cy) {
+  list.Reset(ImageList_Create(cx, cy, ILC_COLOR32, 4, 0));
   if (!list) return;
   // The order fixes the indexes of ItemImage; a missing icon keeps its place.
   for (int id : {IDI_LEVEL, IDI_ADD_LEVEL, IDI_VIRTUAL_FILE}) {
-    HICON icon = static_cast<HICON>(
-        LoadImageW(module, MAKEINTRESOURCEW(id), IMAGE_ICON, cx, cy, LR_CREATEDIBSECTION));
-    if (!icon) icon = BlankIcon(cx, cy);
-    ImageList_ReplaceIcon(list, -1, icon);
-    if (icon) DestroyIcon(icon);
+    win::UniqueIcon icon(static_cast<HICON>(
+        LoadImageW(module, MAKEINTRESOURCEW(id), IMAGE_ICON, cx, cy, LR_CREATEDIBSECTION)));
+    if (!icon) icon.Reset(BlankIcon(cx, cy));
+    ImageList_ReplaceIcon(list.Get(), -1, icon.Get());
   }
-}
-
-void DestroyList(HIMAGELIST& list) {
-  if (list) ImageList_Destroy(list);
-  list = nullptr;
 }
 
 }  // namespace
@@ -46,6 +39,6 @@ void LoadImageLists(HINSTANCE module) {
 }
 
 void DestroyImageLists() {
-  DestroyList(LargeImageList);
-  DestroyList(SmallImageList);
+  LargeImageList.Reset();
+  SmallImageList.Reset();
 }

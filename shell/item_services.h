@@ -3,6 +3,8 @@
 #include <windows.h>
 #include <commctrl.h>
 
+#include "base/win_handles.h"
+
 // Fixed indexes in both lists.
 enum ItemImage : int {
   IMAGE_LEVEL = 0,
@@ -12,8 +14,8 @@ enum ItemImage : int {
 
 // Icons at SM_CXICON and SM_CXSMICON. Only LoadImageLists writes them; views show
 // them with LVS_SHAREIMAGELISTS and never destroy them.
-extern HIMAGELIST LargeImageList;
-extern HIMAGELIST SmallImageList;
+extern win::UniqueImageList LargeImageList;
+extern win::UniqueImageList SmallImageList;
 
 // Module start: (re)builds both lists from icons 101, 102, 104 of `module` (null: this
 // module's own).

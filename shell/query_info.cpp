@@ -4,30 +4,22 @@
 #include <new>
 
 #include "base/boundary.h"
-#include "server/class_creators.h"
 #include "store/pidl_manager.h"
 
-CGravonQueryInfoBase::CGravonQueryInfoBase(CGravonPidlManagerBase* pidlMgr) : m_pidlMgr(pidlMgr) {
-  if (FAILED(SHGetMalloc(&m_malloc))) m_malloc = nullptr;
+CGravonQueryInfoBase::CGravonQueryInfoBase(CGravonPidlManagerBase* pidlMgr) : pidlMgr_(pidlMgr) {
+  if (FAILED(SHGetMalloc(malloc_.Put()))) malloc_.Reset();
 }
 
-CGravonQueryInfoBase::~CGravonQueryInfoBase() {
-  if (m_pidlMgr) m_pidlMgr->Free(m_list);
-  if (m_malloc) m_malloc->Release();
-}
+bool CGravonQueryInfoBase::SetItem(LPCITEMIDLIST fullList) { return pidlMgr_ && pidlMgr_->Assign(list_, fullList); }
 
-bool CGravonQueryInfoBase::SetItem(LPCITEMIDLIST fullList) {
-  return m_pidlMgr && m_pidlMgr->Assign(m_list, fullList);
-}
-
-STDMETHODIMP CGravonQueryInfoBase::GetInfoTip(DWORD, LPWSTR* text) {
+STDMETHODIMP CGravonQueryInfoBase::GetInfoTip(DWORD, LPWSTR* text) noexcept {
   if (!text) return E_INVALIDARG;
   *text = nullptr;
   if (!IsUsable()) return E_OUTOFMEMORY;
   return boundary::Call([&] {
     wchar_t path[MAX_PATH] = {};
-    UINT length = m_pidlMgr->GetPath(m_list, path, MAX_PATH);
-    auto* tip = static_cast<wchar_t*>(m_malloc->Alloc((length + 1) * sizeof(wchar_t)));
+    UINT length = pidlMgr_->GetPath(list_.Get(), path, MAX_PATH);
+    auto* tip = static_cast<wchar_t*>(malloc_->Alloc((length + 1) * sizeof(wchar_t)));
     if (!tip) return E_OUTOFMEMORY;
     std::memcpy(tip, path, length * sizeof(wchar_t));
     tip[length] = 0;
@@ -36,8 +28,8 @@ STDMETHODIMP CGravonQueryInfoBase::GetInfoTip(DWORD, LPWSTR* text) {
   });
 }
 
-STDMETHODIMP CGravonQueryInfoBase::GetInfoFlags(DWORD*) { return E_NOTIMPL; }
+STDMETHODIMP CGravonQueryInfoBase::GetInfoFlags(DWORD*) noexcept { return E_NOTIMPL; }
 
 CMarlixDLQueryInfo::CMarlixDLQueryInfo() : CGravonQueryInfoBase(new (std::nothrow) CPidlMgr) {}
 
-HRESULT CreateMarlixDLQueryInfo(REFIID riid, void** ppv) { return com::CreateInstance<CMarlixDLQueryInfo>(riid, ppv); }
+HRESULT CreateMarlixDLQueryInfo(REFIID riid, void** ppv) noexcept { return com::CreateInstance<CMarlixDLQueryInfo>(riid, ppv); }

@@ -5,7 +5,7 @@
 
 #include <memory>
 
-#include "server/com_base.h"
+#include "base/com_base.h"
 #include "shell/shell_uuids.h"
 #include "store/pidl_base.h"
 
@@ -13,22 +13,24 @@ class CGravonQueryInfoBase : public com::ComObject<IQueryInfo> {
  public:
   // Takes ownership of the manager, which may be null if it could not be made.
   explicit CGravonQueryInfoBase(CGravonPidlManagerBase* pidlMgr);
-  ~CGravonQueryInfoBase() override;
 
   // Keeps a copy of the item's full list; false if it could not be copied.
   bool SetItem(LPCITEMIDLIST fullList);
-  bool IsUsable() const noexcept { return m_pidlMgr && m_malloc; }
+  bool IsUsable() const noexcept { return pidlMgr_ && malloc_; }
 
-  STDMETHODIMP GetInfoTip(DWORD flags, LPWSTR* text) override;
-  STDMETHODIMP GetInfoFlags(DWORD* flags) override;
+  STDMETHODIMP GetInfoTip(DWORD flags, LPWSTR* text) noexcept override;
+  STDMETHODIMP GetInfoFlags(DWORD* flags) noexcept override;
 
  private:
-  LPITEMIDLIST m_list = nullptr;
-  IMalloc* m_malloc = nullptr;
-  std::unique_ptr<CGravonPidlManagerBase> m_pidlMgr;
+  com::ComPtr<IMalloc> malloc_;
+  std::unique_ptr<CGravonPidlManagerBase> pidlMgr_;
+  UniqueIdList list_;
 };
 
 class CMarlixDLQueryInfo : public CGravonQueryInfoBase {
  public:
   CMarlixDLQueryInfo();
 };
+
+// The class object's creator: a tip object with no item.
+HRESULT CreateMarlixDLQueryInfo(REFIID riid, void** ppv) noexcept;

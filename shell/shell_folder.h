@@ -19,5 +19,8 @@ class CMarlixDLShellFolder
  public:
   CMarlixDLShellFolder();
 
-  STDMETHODIMP GetClassID(CLSID* classId) override;
+  STDMETHODIMP GetClassID(CLSID* classId) noexcept override;
 };
+
+// The class object's creator: a root folder, positioned by IPersistFolder::Initialize.
+HRESULT CreateMarlixDLShellFolder(REFIID riid, void** ppv) noexcept;

@@ -8,22 +8,8 @@
 #include "base/boundary.h"
 #include "store/pidl_manager.h"
 
-CGravonShellFolderBase::CGravonShellFolderBase(CGravonPidlManagerBase* pidlMgr) : m_pidlMgr(pidlMgr) {
-  if (FAILED(SHGetMalloc(&m_malloc))) m_malloc = nullptr;
-}
-
-CGravonShellFolderBase::~CGravonShellFolderBase() {
-  Clear();
-  if (m_malloc) m_malloc->Release();
-}
-
-void CGravonShellFolderBase::Clear() {
-  if (m_pidlMgr) m_pidlMgr->Free(m_list);
-  m_list = nullptr;
-  if (m_parent) static_cast<IShellFolder*>(m_parent)->Release();
-  m_parent = nullptr;
-  m_parsingName.reset();
-  m_pathText.reset();
+CGravonShellFolderBase::CGravonShellFolderBase(CGravonPidlManagerBase* pidlMgr) : pidlMgr_(pidlMgr) {
+  if (FAILED(SHGetMalloc(malloc_.Put()))) malloc_.Reset();
 }
 
 void* CGravonShellFolderBase::FindInterface(REFIID riid) noexcept {
@@ -36,11 +22,11 @@ bool CGravonShellFolderBase::GetFolderPath(wchar_t* destination, UINT size, bool
   if (!destination) return false;
   if (size) destination[0] = 0;
   wchar_t parentText[MAX_PATH] = {};
-  if (m_parent && !m_parent->GetFolderPath(parentText, MAX_PATH, parsing)) parentText[0] = 0;
+  if (parent_ && !parent_->GetFolderPath(parentText, MAX_PATH, parsing)) parentText[0] = 0;
   const size_t parentLength = wcslen(parentText);
 
-  const bool useParsingName = parsing && m_parsingName;
-  const wchar_t* own = useParsingName ? m_parsingName.get() : (m_pathText ? m_pathText.get() : L"");
+  const bool useParsingName = parsing && parsingName_;
+  const wchar_t* own = useParsingName ? parsingName_.get() : (pathText_ ? pathText_.get() : L"");
   const size_t ownLength = wcslen(own);
   // The parsing form joins with a backslash only under a parent; the plain form always does.
   const bool separator = useParsingName ? parentLength != 0 : ownLength != 0;
@@ -58,31 +44,31 @@ bool CGravonShellFolderBase::GetFolderPath(wchar_t* destination, UINT size, bool
 
 HRESULT CGravonShellFolderBase::Init(CGravonShellFolderBase* parent, LPCITEMIDLIST list) {
   if (!IsUsable()) return E_OUTOFMEMORY;
-  if (parent) static_cast<IShellFolder*>(parent)->AddRef();
-  Clear();
-  m_parent = parent;
-  m_list = list ? m_pidlMgr->Copy(list) : m_pidlMgr->CreateRoot();
-  if (!m_list) return E_OUTOFMEMORY;
-  if (m_pidlMgr->IsRoot(m_list)) {
-    UINT length = m_pidlMgr->GetRootParsingName(nullptr, 0);
-    m_parsingName.reset(new (std::nothrow) wchar_t[length + 1]());
-    if (!m_parsingName) return E_OUTOFMEMORY;
-    m_pidlMgr->GetRootParsingName(m_parsingName.get(), length);
+  parent_ = com::ComPtr<CGravonShellFolderBase>(parent);
+  parsingName_.reset();
+  pathText_.reset();
+  list_.Reset(list ? pidlMgr_->Copy(list) : pidlMgr_->CreateRoot());
+  if (!list_) return E_OUTOFMEMORY;
+  if (pidlMgr_->IsRoot(list_.Get())) {
+    UINT length = pidlMgr_->GetRootParsingName(nullptr, 0);
+    parsingName_.reset(new (std::nothrow) wchar_t[length + 1]());
+    if (!parsingName_) return E_OUTOFMEMORY;
+    pidlMgr_->GetRootParsingName(parsingName_.get(), length);
   }
-  UINT length = m_pidlMgr->GetPath(m_list, nullptr, 0);
-  m_pathText.reset(new (std::nothrow) wchar_t[length + 1]());
-  if (!m_pathText) return E_OUTOFMEMORY;
-  m_pidlMgr->GetPath(m_list, m_pathText.get(), length);
+  UINT length = pidlMgr_->GetPath(list_.Get(), nullptr, 0);
+  pathText_.reset(new (std::nothrow) wchar_t[length + 1]());
+  if (!pathText_) return E_OUTOFMEMORY;
+  pidlMgr_->GetPath(list_.Get(), pathText_.get(), length);
   return S_OK;
 }
 
-STDMETHODIMP CGravonShellFolderBase::Initialize(PCIDLIST_ABSOLUTE) {
+STDMETHODIMP CGravonShellFolderBase::Initialize(PCIDLIST_ABSOLUTE) noexcept {
   return boundary::Call([&] { return Init(nullptr, nullptr); });
 }
 
 // The name is a path below this folder; the store is not asked, so any level name parses.
 STDMETHODIMP CGravonShellFolderBase::ParseDisplayName(HWND, IBindCtx*, LPWSTR name, ULONG*,
-                                                      PIDLIST_RELATIVE* result, ULONG*) {
+                                                      PIDLIST_RELATIVE* result, ULONG*) noexcept {
   if (!result) return E_INVALIDARG;
   *result = nullptr;
   if (!name || !IsUsable()) return E_INVALIDARG;
@@ -91,49 +77,43 @@ STDMETHODIMP CGravonShellFolderBase::ParseDisplayName(HWND, IBindCtx*, LPWSTR na
     GetFolderPath(folder, MAX_PATH, false);
     std::wstring full = std::wstring(folder) + L'\\' + name;
     const UINT m = static_cast<UINT>(PathComponents(name).size());
-    LPITEMIDLIST list = m_pidlMgr->CreateListFromPath(full.c_str());
+    UniqueIdList list(pidlMgr_->CreateListFromPath(full.c_str()));
     if (!list) return E_INVALIDARG;
-    const UINT n = m_pidlMgr->GetCount(list);
-    HRESULT hr = S_OK;
-    if (m < n) {
-      *result = m_pidlMgr->CopyFrom(list, n - m);
-      if (!*result && m > 0) hr = E_OUTOFMEMORY;
-    } else {
-      hr = E_INVALIDARG;
-    }
-    m_pidlMgr->Free(list);
-    return hr;
+    const UINT n = pidlMgr_->GetCount(list.Get());
+    if (m >= n) return E_INVALIDARG;
+    *result = pidlMgr_->CopyFrom(list.Get(), n - m);
+    return !*result && m > 0 ? E_OUTOFMEMORY : S_OK;
   });
 }
 
-STDMETHODIMP CGravonShellFolderBase::BindToStorage(PCUIDLIST_RELATIVE, IBindCtx*, REFIID, void** result) {
+STDMETHODIMP CGravonShellFolderBase::BindToStorage(PCUIDLIST_RELATIVE, IBindCtx*, REFIID, void** result) noexcept {
   if (result) *result = nullptr;
   return E_NOTIMPL;
 }
 
 // The raw comparison is the answer, not a code with the order in its low word.
 STDMETHODIMP CGravonShellFolderBase::CompareIDs(LPARAM parameter, PCUIDLIST_RELATIVE first,
-                                                PCUIDLIST_RELATIVE second) {
-  if (!m_pidlMgr) return 0;
-  return boundary::Call([&] { return static_cast<HRESULT>(m_pidlMgr->Compare(parameter, first, second)); });
+                                                PCUIDLIST_RELATIVE second) noexcept {
+  if (!pidlMgr_) return 0;
+  return boundary::Call([&] { return static_cast<HRESULT>(pidlMgr_->Compare(parameter, first, second)); });
 }
 
 // The caller's mask plays no part, and only the first item is ever validated.
 STDMETHODIMP CGravonShellFolderBase::GetAttributesOf(UINT count, PCUITEMID_CHILD_ARRAY items,
-                                                     SFGAOF* attributes) {
+                                                     SFGAOF* attributes) noexcept {
   if (!attributes) return E_INVALIDARG;
   *attributes = 0xFFFFFFFF;
   if (count == 0) return S_OK;
-  if (!items || !m_pidlMgr) return E_INVALIDARG;
+  if (!items || !pidlMgr_) return E_INVALIDARG;
   return boundary::Call([&] { return AttributesOf(count, items, *attributes); });
 }
 
 HRESULT CGravonShellFolderBase::AttributesOf(UINT count, PCUITEMID_CHILD_ARRAY items, SFGAOF& attributes) {
   for (UINT i = 0; i < count; ++i) {
     LPCITEMIDLIST item = items[i];
-    if ((attributes & SFGAO_VALIDATE) && !m_pidlMgr->IsValid(item)) return E_FAIL;
+    if ((attributes & SFGAO_VALIDATE) && !pidlMgr_->IsValid(item)) return E_FAIL;
     SFGAOF own = 0;
-    LPCITEMIDLIST last = m_pidlMgr->GetLast(item);
+    LPCITEMIDLIST last = pidlMgr_->GetLast(item);
     if (last) {
       switch (CPidlMgr::GetType(last)) {
         case PIDL_LEVEL: own = SFGAO_FOLDER | SFGAO_DROPTARGET; break;
@@ -146,7 +126,7 @@ HRESULT CGravonShellFolderBase::AttributesOf(UINT count, PCUITEMID_CHILD_ARRAY i
   return S_OK;
 }
 
-STDMETHODIMP CGravonShellFolderBase::GetDisplayNameOf(PCUITEMID_CHILD item, SHGDNF flags, STRRET* name) {
+STDMETHODIMP CGravonShellFolderBase::GetDisplayNameOf(PCUITEMID_CHILD item, SHGDNF flags, STRRET* name) noexcept {
   if (!name) return E_INVALIDARG;
   if (!IsUsable()) return E_OUTOFMEMORY;
   return boundary::Call([&] { return DisplayNameOf(item, flags, *name); });
@@ -158,23 +138,23 @@ HRESULT CGravonShellFolderBase::DisplayNameOf(PCUITEMID_CHILD item, SHGDNF flags
   const DWORD low = flags & 0xFF;
   if (high == 0 || high == 0x40) {
     if (low > 1) return E_INVALIDARG;
-    m_pidlMgr->GetPath(item, text, MAX_PATH);
+    pidlMgr_->GetPath(item, text, MAX_PATH);
   } else if (high == 0x80) {
     if (low == 0) {
       GetFolderPath(text, MAX_PATH, true);
       size_t length = wcslen(text);
       if (length + 1 < MAX_PATH) {
         text[length] = L'\\';
-        m_pidlMgr->GetPath(item, text + length + 1, static_cast<UINT>(MAX_PATH - length - 1));
+        pidlMgr_->GetPath(item, text + length + 1, static_cast<UINT>(MAX_PATH - length - 1));
       }
     } else if (low == 1) {
-      m_pidlMgr->GetPath(item, text, MAX_PATH);
+      pidlMgr_->GetPath(item, text, MAX_PATH);
     }
   } else {
     return E_INVALIDARG;
   }
   const size_t bytes = (wcslen(text) + 1) * sizeof(wchar_t);
-  auto* copy = static_cast<wchar_t*>(m_malloc->Alloc(bytes));
+  auto* copy = static_cast<wchar_t*>(malloc_->Alloc(bytes));
   if (!copy) return E_OUTOFMEMORY;
   std::memcpy(copy, text, bytes);
   name.uType = STRRET_WSTR;
@@ -182,7 +162,7 @@ HRESULT CGravonShellFolderBase::DisplayNameOf(PCUITEMID_CHILD item, SHGDNF flags
   return S_OK;
 }
 
-STDMETHODIMP CGravonShellFolderBase::SetNameOf(HWND, PCUITEMID_CHILD, LPCWSTR, SHGDNF, PITEMID_CHILD* result) {
+STDMETHODIMP CGravonShellFolderBase::SetNameOf(HWND, PCUITEMID_CHILD, LPCWSTR, SHGDNF, PITEMID_CHILD* result) noexcept {
   if (result) *result = nullptr;
   return E_NOTIMPL;
 }

@@ -6,14 +6,13 @@
 
 #include <memory>
 
-#include "server/com_base.h"
+#include "base/com_base.h"
 #include "store/pidl_base.h"
 
 class CGravonShellFolderBase : public com::ComObject<IShellFolder, IPersistFolder> {
  public:
   // Takes ownership of the manager (null if it could not be made).
   explicit CGravonShellFolderBase(CGravonPidlManagerBase* pidlMgr);
-  ~CGravonShellFolderBase() override;
 
   // The folder's address. Plain: the parent's address, a backslash and this folder's
   // text, so it starts with a backslash. Parsing: at the root the root's parsing
@@ -22,32 +21,31 @@ class CGravonShellFolderBase : public com::ComObject<IShellFolder, IPersistFolde
   // Positions the folder under `parent` (null at the root) at `list` (null: the root).
   HRESULT Init(CGravonShellFolderBase* parent, LPCITEMIDLIST list);
   // False if the object could not get its allocator or list manager.
-  bool IsUsable() const noexcept { return m_pidlMgr && m_malloc; }
+  bool IsUsable() const noexcept { return pidlMgr_ && malloc_; }
 
   // IShellFolder
   STDMETHODIMP ParseDisplayName(HWND window, IBindCtx* context, LPWSTR name, ULONG* eaten,
-                                PIDLIST_RELATIVE* result, ULONG* attributes) override;
-  STDMETHODIMP BindToStorage(PCUIDLIST_RELATIVE list, IBindCtx* context, REFIID riid, void** result) override;
-  STDMETHODIMP CompareIDs(LPARAM parameter, PCUIDLIST_RELATIVE first, PCUIDLIST_RELATIVE second) override;
-  STDMETHODIMP GetAttributesOf(UINT count, PCUITEMID_CHILD_ARRAY items, SFGAOF* attributes) override;
-  STDMETHODIMP GetDisplayNameOf(PCUITEMID_CHILD item, SHGDNF flags, STRRET* name) override;
+                                PIDLIST_RELATIVE* result, ULONG* attributes) noexcept override;
+  STDMETHODIMP BindToStorage(PCUIDLIST_RELATIVE list, IBindCtx* context, REFIID riid, void** result) noexcept override;
+  STDMETHODIMP CompareIDs(LPARAM parameter, PCUIDLIST_RELATIVE first, PCUIDLIST_RELATIVE second) noexcept override;
+  STDMETHODIMP GetAttributesOf(UINT count, PCUITEMID_CHILD_ARRAY items, SFGAOF* attributes) noexcept override;
+  STDMETHODIMP GetDisplayNameOf(PCUITEMID_CHILD item, SHGDNF flags, STRRET* name) noexcept override;
   STDMETHODIMP SetNameOf(HWND window, PCUITEMID_CHILD item, LPCWSTR name, SHGDNF flags,
-                         PITEMID_CHILD* result) override;
+                         PITEMID_CHILD* result) noexcept override;
 
   // IPersistFolder: always positions at the root, whatever the shell passes.
-  STDMETHODIMP Initialize(PCIDLIST_ABSOLUTE list) override;
+  STDMETHODIMP Initialize(PCIDLIST_ABSOLUTE list) noexcept override;
 
  protected:
   void* FindInterface(REFIID riid) noexcept override;
-  void Clear();
   // The bodies of the slots above that allocate; the slots keep exceptions inside.
   HRESULT AttributesOf(UINT count, PCUITEMID_CHILD_ARRAY items, SFGAOF& attributes);
   HRESULT DisplayNameOf(PCUITEMID_CHILD item, SHGDNF flags, STRRET& name);
 
-  LPITEMIDLIST m_list = nullptr;
-  CGravonShellFolderBase* m_parent = nullptr;
-  IMalloc* m_malloc = nullptr;
-  std::unique_ptr<CGravonPidlManagerBase> m_pidlMgr;
-  std::unique_ptr<wchar_t[]> m_parsingName;
-  std::unique_ptr<wchar_t[]> m_pathText;
+  UniqueIdList list_;
+  com::ComPtr<CGravonShellFolderBase> parent_;
+  com::ComPtr<IMalloc> malloc_;
+  std::unique_ptr<CGravonPidlManagerBase> pidlMgr_;
+  std::unique_ptr<wchar_t[]> parsingName_;
+  std::unique_ptr<wchar_t[]> pathText_;
 };

@@ -3,7 +3,6 @@
 #include <windows.h>
 #include <shlobj.h>
 
-#include <type_traits>
 
 #include "base/boundary.h"
 #include "shell/shell_folder_base.h"
@@ -23,7 +22,7 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
  public:
   using CGravonShellFolderBase::CGravonShellFolderBase;
 
-  STDMETHODIMP EnumObjects(HWND, SHCONTF flags, IEnumIDList** result) override {
+  STDMETHODIMP EnumObjects(HWND, SHCONTF flags, IEnumIDList** result) noexcept override {
     if (!result) return E_INVALIDARG;
     *result = nullptr;
     return boundary::Call([&] {
@@ -40,10 +39,10 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
     });
   }
 
-  STDMETHODIMP BindToObject(PCUIDLIST_RELATIVE list, IBindCtx*, REFIID riid, void** result) override {
+  STDMETHODIMP BindToObject(PCUIDLIST_RELATIVE list, IBindCtx*, REFIID riid, void** result) noexcept override {
     if (!result) return E_INVALIDARG;
     *result = nullptr;
-    if (!list || m_pidlMgr->IsFile(list)) return E_INVALIDARG;
+    if (!list || pidlMgr_->IsFile(list)) return E_INVALIDARG;
     return boundary::Call([&] {
       auto folder = com::Make<TFolder>();
       if (!folder) return E_OUTOFMEMORY;
@@ -53,7 +52,7 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
     });
   }
 
-  STDMETHODIMP CreateViewObject(HWND, REFIID riid, void** result) override {
+  STDMETHODIMP CreateViewObject(HWND, REFIID riid, void** result) noexcept override {
     if (!result) return E_INVALIDARG;
     *result = nullptr;
     return boundary::Call([&] { return CreateViewObjectOf(riid, result); });
@@ -61,7 +60,7 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
 
   // One object for one item, handed the item's full list; no multiple selections here.
   STDMETHODIMP GetUIObjectOf(HWND, UINT count, PCUITEMID_CHILD_ARRAY items, REFIID riid, UINT*,
-                             void** result) override {
+                             void** result) noexcept override {
     if (!result) return E_INVALIDARG;
     *result = nullptr;
     if (count != 1) return E_FAIL;
@@ -74,7 +73,7 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
     if (riid == IID_IShellView) {
       auto view = com::Make<TView>();
       if (!view) return E_OUTOFMEMORY;
-      HRESULT hr = view->Init(static_cast<IShellFolder*>(this), m_list);
+      HRESULT hr = view->Init(static_cast<IShellFolder*>(this), list_.Get());
       if (FAILED(hr)) return hr;
       return view->QueryInterface(riid, result);
     }
@@ -101,22 +100,10 @@ class CGravonShellFolderImpl : public CGravonShellFolderBase {
   HRESULT MakeItemObject(LPCITEMIDLIST item, REFIID riid, void** result, Attach attach) {
     wchar_t path[MAX_PATH];
     if (!GetFolderPath(path, MAX_PATH, false)) return E_FAIL;
-    LPITEMIDLIST folderList = m_pidlMgr->CreateListFromPath(path);
-    LPITEMIDLIST full = m_pidlMgr->Concatenate(folderList, item);
-    m_pidlMgr->Free(folderList);
+    UniqueIdList full(pidlMgr_->Concatenate(UniqueIdList(pidlMgr_->CreateListFromPath(path)).Get(), item));
     auto object = com::Make<T>();
-    if (!object || !full) {
-      m_pidlMgr->Free(full);
-      return E_OUTOFMEMORY;
-    }
     // An object without its list or its item manager would answer for nothing.
-    bool attached = true;
-    if constexpr (std::is_same_v<decltype(attach(*object.Get(), full)), bool>)
-      attached = attach(*object.Get(), full);
-    else
-      attach(*object.Get(), full);
-    m_pidlMgr->Free(full);
-    if (!attached) return E_OUTOFMEMORY;
+    if (!object || !full || !attach(*object.Get(), full.Get())) return E_OUTOFMEMORY;
     if constexpr (requires { object->IsUsable(); })
       if (!object->IsUsable()) return E_OUTOFMEMORY;
     return object->QueryInterface(riid, result);

@@ -1,4 +1,5 @@
-// The view's COM surface, its creation and its destruction.
+// The view's own answers to the browser, its refreshing, and the enumeration that fills
+// its list from a worker thread.
 #include "shell/shell_view.h"
 
 #include <new>
@@ -6,35 +7,51 @@
 #include "base/boundary.h"
 #include "base/module_instance.h"
 #include "base/resource_ids.h"
-#include "server/class_creators.h"
+#include "base/window_messages.h"
 #include "shell/shell_folder_base.h"
 #include "store/string_table.h"
 
-LRESULT CALLBACK ViewWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
+namespace {
+
+constexpr DWORD kAnimateStyle = WS_CHILD | WS_VISIBLE | ACS_CENTER | ACS_TRANSPARENT | ACS_AUTOPLAY;
+constexpr DWORD kEnumThreadStack = 0x100000;
+
+// Off the window's thread: asks the folder for its items and posts them to the view.
+// Touches nothing but its job, and keeps the module mapped until it has left it.
+DWORD WINAPI EnumThreadProc(void* parameter) {
+  auto* job = static_cast<EnumJob*>(parameter);
+  SetThreadLocale(job->Locale);
+  IEnumIDList* list = nullptr;
+  if (FAILED(job->Folder->EnumObjects(job->ViewWindow, SHCONTF_FOLDERS | SHCONTF_NONFOLDERS, &list))) list = nullptr;
+  job->Result.store(list);
+  if (!IsWindow(job->ViewWindow) ||
+      !PostMessageW(job->ViewWindow, GetEnumIDListMessage, 0, reinterpret_cast<LPARAM>(list)))
+    job->DropResult();
+  job->Folder.Reset();
+  HMODULE module = job->Module;
+  job->Release();
+  if (module) FreeLibraryAndExitThread(module, 0);
+  return 0;
+}
+
+}  // namespace
+
+void EnumJob::DropResult() noexcept {
+  if (IEnumIDList* list = Result.exchange(nullptr)) list->Release();
+}
+
+void EnumJob::Release() noexcept {
+  if (--Refs == 0) {
+    DropResult();
+    delete this;
+  }
+}
 
 CMarlixDLShellView::CMarlixDLShellView() {
   InitCommonControls();
-  if (FAILED(SHGetMalloc(&Malloc))) Malloc = nullptr;
+  if (FAILED(SHGetMalloc(Malloc.Put()))) Malloc.Reset();
   PidlMgr.reset(new (std::nothrow) CPidlMgr);
   AddNewText = LoadTranslatedString(IDS_ADD_NEW_LEVEL);
-}
-
-CMarlixDLShellView::~CMarlixDLShellView() {
-  // A host that never called DestroyViewWindow must not leave a window behind that
-  // would call into a freed object.
-  if (IsWindow(ViewWindow)) {
-    SetWindowLongPtrW(ViewWindow, GWLP_USERDATA, 0);
-    DestroyWindow(ViewWindow);
-  }
-  ReleaseEnumJob();
-  if (PidlMgr) PidlMgr->Free(FolderIdList);
-  ShellFolder.Reset();
-  if (Malloc) Malloc->Release();
-  DestroyNotifyWindow(NotifyWindow);
-  ReleaseMergedMenu();
-  if (DragImage) ImageList_Destroy(DragImage);
-  CommDlgBrowser.Reset();
-  ShellBrowser.Reset();
 }
 
 HRESULT CMarlixDLShellView::Init(IShellFolder* folder, LPCITEMIDLIST folderIdList) {
@@ -47,113 +64,43 @@ HRESULT CMarlixDLShellView::Init(IShellFolder* folder, LPCITEMIDLIST folderIdLis
   return S_OK;
 }
 
-tagPIDLTYPE CMarlixDLShellView::FolderType() {
-  LPCITEMIDLIST last = PidlMgr ? PidlMgr->GetLast(FolderIdList) : nullptr;
-  return last ? CPidlMgr::GetType(last) : tagPIDLTYPE{};
-}
-
-STDMETHODIMP CMarlixDLShellView::GetWindow(HWND* window) {
+STDMETHODIMP CMarlixDLShellView::GetWindow(HWND* window) noexcept {
   if (!window) return E_INVALIDARG;
   *window = ViewWindow;
   return S_OK;
 }
 
-STDMETHODIMP CMarlixDLShellView::ContextSensitiveHelp(BOOL) { return E_NOTIMPL; }
+STDMETHODIMP CMarlixDLShellView::ContextSensitiveHelp(BOOL) noexcept { return E_NOTIMPL; }
 
 // The browser is always told S_FALSE, so it may also see a key that matched. Hosts hand over
 // every message of their loop: a key typed in the address bar or an Open dialog's file-name
 // box is theirs, and a Delete there must not delete the selected level.
-STDMETHODIMP CMarlixDLShellView::TranslateAccelerator(MSG* msg) {
+STDMETHODIMP CMarlixDLShellView::TranslateAccelerator(MSG* msg) noexcept {
   if (msg && Accelerators && IsWindow(ViewWindow) && (msg->hwnd == ViewWindow || IsChild(ViewWindow, msg->hwnd)))
     ::TranslateAcceleratorW(ViewWindow, Accelerators, msg);
   return S_FALSE;
 }
 
-STDMETHODIMP CMarlixDLShellView::EnableModeless(BOOL) { return E_NOTIMPL; }
+STDMETHODIMP CMarlixDLShellView::EnableModeless(BOOL) noexcept { return E_NOTIMPL; }
 
-STDMETHODIMP CMarlixDLShellView::UIActivate(UINT state) {
-  return boundary::Call([&] {
-    if (state == UIState) return S_OK;
-    ActivateUI(state);
-    if (state != SVUIA_DEACTIVATE) SetStatusText();
-    return S_OK;
-  });
-}
-
-STDMETHODIMP CMarlixDLShellView::Refresh() {
+STDMETHODIMP CMarlixDLShellView::Refresh() noexcept {
   if (IsWindow(ListWindow)) SendMessageW(ListWindow, LVM_DELETEALLITEMS, 0, 0);
   StartEnumeration();
   return S_OK;
 }
 
-STDMETHODIMP CMarlixDLShellView::CreateViewWindow(IShellView* previous, LPCFOLDERSETTINGS settings,
-                                                  IShellBrowser* browser, RECT* rect, HWND* out) {
-  if (!out) return E_INVALIDARG;
-  *out = nullptr;
-  if (!browser || !settings || !rect || !IsUsable()) return E_INVALIDARG;
-  if (IsWindow(ViewWindow)) return E_UNEXPECTED;  // one window per view object
-  HINSTANCE module = ModuleInstance();
-  if (!RegisterModuleClass(kViewWindowClass, ViewWindowProc)) return E_FAIL;
-
-  ShellBrowser = com::ComPtr<IShellBrowser>(browser);
-  CommDlgBrowser.Reset();
-  if (FAILED(browser->QueryInterface(IID_ICommDlgBrowser, CommDlgBrowser.PutVoid()))) CommDlgBrowser.Reset();
-  FolderSettings = *settings;
-
-  // A view that follows one of ours keeps its mode; one that follows a foreign view
-  // takes the mode the browser stored for the folder.
-  if (previous) {
-    com::ComPtr<IUnknown> ours;
-    if (SUCCEEDED(previous->QueryInterface(IID_IMarlixDigitalLevelsShellView, ours.PutVoid()))) {
-      previous->GetCurrentInfo(&FolderSettings);
-    } else {
-      com::ComPtr<IStream> stream;
-      if (browser->GetViewStateStream(STGM_READ, stream.Put()) == S_OK && stream) {
-        UINT mode = FolderSettings.ViewMode;
-        ULONG read = 0;
-        if (SUCCEEDED(stream->Read(&mode, sizeof(mode), &read)) && read == sizeof(mode)) FolderSettings.ViewMode = mode;
-      }
-    }
-  }
-
-  browser->SetToolbarItems(nullptr, 0, FCT_MERGE);
-  ParentWindow = nullptr;
-  if (FAILED(browser->GetWindow(&ParentWindow))) ParentWindow = nullptr;
-
-  HWND window = CreateWindowExW(0, kViewWindowClass, nullptr, WS_CHILD | WS_VISIBLE | WS_CLIPSIBLINGS, rect->left,
-                                rect->top, rect->right - rect->left, rect->bottom - rect->top, ParentWindow, nullptr,
-                                module, static_cast<IShellView*>(this));
-  if (!window) {
-    ViewWindow = nullptr;
-    return E_FAIL;
-  }
-  *out = window;
-  Accelerators = LoadAcceleratorsW(module, MAKEINTRESOURCEW(IDR_VIEW_ACCELERATORS));
-  NotifyWindow.ViewWindow = ViewWindow;
-  if (!IsWindow(NotifyWindow.Hidden)) CreateNotifyWindow(NotifyWindow, ViewWindow);
-  return S_OK;
-}
-
-STDMETHODIMP CMarlixDLShellView::DestroyViewWindow() {
-  com::ComPtr<CMarlixDLShellView> keep(this);  // the window's going may drop the last other reference
-  UIActivate(SVUIA_DEACTIVATE);
-  ReleaseMergedMenu();
-  if (IsWindow(ViewWindow)) DestroyWindow(ViewWindow);
-  ShellBrowser.Reset();
-  CommDlgBrowser.Reset();
-  return S_OK;
-}
-
-STDMETHODIMP CMarlixDLShellView::GetCurrentInfo(LPFOLDERSETTINGS settings) {
+STDMETHODIMP CMarlixDLShellView::GetCurrentInfo(LPFOLDERSETTINGS settings) noexcept {
   if (!settings) return E_INVALIDARG;
   *settings = FolderSettings;
   return S_OK;
 }
 
-STDMETHODIMP CMarlixDLShellView::AddPropertySheetPages(DWORD, LPFNSVADDPROPSHEETPAGE, LPARAM) { return E_NOTIMPL; }
+STDMETHODIMP CMarlixDLShellView::AddPropertySheetPages(DWORD, LPFNSVADDPROPSHEETPAGE, LPARAM) noexcept {
+  return E_NOTIMPL;
+}
 
 // Only the mode is kept; column widths and the sort order are not part of it.
-STDMETHODIMP CMarlixDLShellView::SaveViewState() {
+STDMETHODIMP CMarlixDLShellView::SaveViewState() noexcept {
   if (!ShellBrowser) return E_UNEXPECTED;
   com::ComPtr<IStream> stream;
   HRESULT hr = ShellBrowser->GetViewStateStream(STGM_WRITE, stream.Put());
@@ -163,27 +110,20 @@ STDMETHODIMP CMarlixDLShellView::SaveViewState() {
   return stream->Write(&mode, sizeof(mode), nullptr);
 }
 
-STDMETHODIMP CMarlixDLShellView::SelectItem(PCUITEMID_CHILD, UINT) { return E_NOTIMPL; }
+STDMETHODIMP CMarlixDLShellView::SelectItem(PCUITEMID_CHILD, UINT) noexcept { return E_NOTIMPL; }
 
 // The object of the first selected row, or of row 0 when nothing is selected.
-STDMETHODIMP CMarlixDLShellView::GetItemObject(UINT item, REFIID riid, void** ppv) {
+STDMETHODIMP CMarlixDLShellView::GetItemObject(UINT item, REFIID riid, void** ppv) noexcept {
   if (!ppv) return E_INVALIDARG;
   *ppv = nullptr;
   if (item != SVGIO_SELECTION) return E_NOINTERFACE;
   if (!ShellFolder) return E_UNEXPECTED;
-  int count = IsWindow(ListWindow) ? static_cast<int>(SendMessageW(ListWindow, LVM_GETITEMCOUNT, 0, 0)) : 0;
-  int row = 0;
-  for (int i = 0; i < count; ++i) {
-    if (SendMessageW(ListWindow, LVM_GETITEMSTATE, i, LVIS_SELECTED) & LVIS_SELECTED) {
-      row = i;
-      break;
-    }
-  }
+  if (!IsWindow(ListWindow)) return E_INVALIDARG;
   LVITEMW lvi{};
   lvi.mask = LVIF_PARAM;
-  lvi.iItem = row;
-  if (!IsWindow(ListWindow) || !SendMessageW(ListWindow, LVM_GETITEMW, 0, reinterpret_cast<LPARAM>(&lvi)))
-    return E_INVALIDARG;
+  lvi.iItem = std::max(0, static_cast<int>(SendMessageW(ListWindow, LVM_GETNEXTITEM, static_cast<WPARAM>(-1),
+                                                        LVNI_SELECTED)));
+  if (!SendMessageW(ListWindow, LVM_GETITEMW, 0, reinterpret_cast<LPARAM>(&lvi))) return E_INVALIDARG;
   LPCITEMIDLIST id = reinterpret_cast<LPCITEMIDLIST>(lvi.lParam);
   return ShellFolder->GetUIObjectOf(ViewWindow, 1, &id, riid, nullptr, ppv);
 }
@@ -215,5 +155,49 @@ void CMarlixDLShellView::RefreshAll() {
     SendMessageW(browserWindow, WM_COMMAND, kCmdBrowserRefresh, 0);
 }
 
-// Made from outside, a view has no folder until one calls Init: it shows an empty list.
-HRESULT CreateMarlixDLShellView(REFIID riid, void** ppv) { return com::CreateInstance<CMarlixDLShellView>(riid, ppv); }
+// One thread at a time. A refresh while one runs is remembered, and run once it has ended:
+// its result may already miss a level added or renamed meanwhile.
+void CMarlixDLShellView::StartEnumeration() {
+  if (EnumThreadMarker != -1) {
+    RefreshPending = true;
+    return;
+  }
+  if (!ShellFolder || !IsWindow(ViewWindow)) return;
+  ReleaseEnumJob();
+  // Made before the clip: with no job there is no thread to stop the clip again.
+  auto* job = new (std::nothrow) EnumJob;
+  if (!job) return;
+  if (IsWindow(AnimateWindow)) DestroyWindow(AnimateWindow);
+  AnimateWindow = CreateWindowExW(0, ANIMATE_CLASSW, nullptr, kAnimateStyle, 0, 0, 0, 0, ListWindow,
+                                  reinterpret_cast<HMENU>(static_cast<INT_PTR>(kAnimateWindowId)), ModuleInstance(),
+                                  nullptr);
+  if (AnimateWindow)
+    SendMessageW(AnimateWindow, ACM_OPENW, reinterpret_cast<WPARAM>(ModuleInstance()),
+                 reinterpret_cast<LPARAM>(MAKEINTRESOURCEW(IDR_ENUM_CLIP)));
+  job->ViewWindow = ViewWindow;
+  job->Folder = ShellFolder;
+  job->Locale = ThreadLocale;
+  // The thread keeps the module loaded until it has returned out of it.
+  win::UniqueLibrary module;
+  GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS, reinterpret_cast<LPCWSTR>(&EnumThreadProc), module.Put());
+  job->Module = module.Get();
+  win::UniqueHandle thread(CreateThread(nullptr, kEnumThreadStack, EnumThreadProc, job, 0, nullptr));
+  if (!thread) {
+    job->Refs = 1;
+    job->Release();
+    if (IsWindow(AnimateWindow)) DestroyWindow(AnimateWindow);
+    AnimateWindow = nullptr;
+    return;
+  }
+  module.Release();  // the thread's to give back
+  RunningJob = job;
+  EnumThreadMarker = reinterpret_cast<INT_PTR>(thread.Get());
+}
+
+void CMarlixDLShellView::ReleaseEnumJob() {
+  if (RunningJob) {
+    RunningJob->DropResult();
+    RunningJob->Release();
+    RunningJob = nullptr;
+  }
+}

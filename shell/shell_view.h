@@ -1,28 +1,32 @@
 // The folder's view: a TSViewNSClass window in the browser with one list control,
-// filled from a worker thread. Spread over files by concern:
-//   shell_view.cpp           COM surface, creation and destruction
-//   shell_view_window.cpp    window procedure, list, fill and the enumeration thread
-//   shell_view_modes.cpp     view modes, columns and sorting
-//   shell_view_commands.cpp  the command dispatcher, command target and activation
-//   shell_view_menus.cpp     merged menus and the context menu
+// filled from a worker thread. Spread over files by concern, each calling only the ones
+// listed before it, so that the files never call each other in a circle:
+//   shell_view_list.cpp      the list control: modes, column, sorting, rows and the selection
+//   shell_view.cpp           the view's own answers, refreshing and the enumeration thread
+//   shell_view_menus.cpp     activation, the merged menus and the context menu
 //   shell_view_items.cpp     operations on items: new, properties, delete, copy, paste, drag
+//   shell_view_commands.cpp  the command dispatcher, the command target and opening items
+//   shell_view_window.cpp    creation and destruction of the window, and its procedure
 #pragma once
 #include <windows.h>
 #include <commctrl.h>
 #include <docobj.h>
 #include <shlobj.h>
 
+#include <algorithm>
 #include <atomic>
 #include <memory>
 #include <string>
 #include <vector>
 
-#include "server/class_ids.h"
-#include "server/com_base.h"
+#include "base/class_ids.h"
+#include "base/com_base.h"
+#include "base/win_handles.h"
 #include "shell/view_notify.h"
 #include "store/pidl_manager.h"
 
 class CGravonShellFolderBase;
+class CMarlixDLDataObject;
 
 constexpr wchar_t kViewWindowClass[] = L"TSViewNSClass";
 
@@ -76,11 +80,11 @@ class CShellViewListWindow {
 // (the view's fill, or the view's window going away).
 struct EnumJob {
   HWND ViewWindow = nullptr;
-  IShellFolder* Folder = nullptr;  // counted
+  com::ComPtr<IShellFolder> Folder;
   LCID Locale = 0;
-  HMODULE Module = nullptr;        // a load reference the thread gives back as it ends
+  HMODULE Module = nullptr;  // a load reference the thread gives back as it ends
   std::atomic<IEnumIDList*> Result{nullptr};
-  std::atomic<long> Refs{2};       // the thread's and the view's
+  std::atomic<long> Refs{2};  // the thread's and the view's
 
   // Releases whatever the slot still holds.
   void DropResult() noexcept;
@@ -94,29 +98,29 @@ class CMarlixDLShellView
   ~CMarlixDLShellView() override;
 
   // False if the constructor could not get its allocator or list manager.
-  bool IsUsable() const noexcept { return Malloc != nullptr && PidlMgr != nullptr; }
+  bool IsUsable() const noexcept { return Malloc && PidlMgr; }
   // Called by the folder right after construction.
   HRESULT Init(IShellFolder* folder, LPCITEMIDLIST folderIdList);
 
   // IOleWindow
-  STDMETHODIMP GetWindow(HWND* window) override;
-  STDMETHODIMP ContextSensitiveHelp(BOOL enter) override;
+  STDMETHODIMP GetWindow(HWND* window) noexcept override;
+  STDMETHODIMP ContextSensitiveHelp(BOOL enter) noexcept override;
   // IShellView
-  STDMETHODIMP TranslateAccelerator(MSG* msg) override;
-  STDMETHODIMP EnableModeless(BOOL enable) override;
-  STDMETHODIMP UIActivate(UINT state) override;
-  STDMETHODIMP Refresh() override;
+  STDMETHODIMP TranslateAccelerator(MSG* msg) noexcept override;
+  STDMETHODIMP EnableModeless(BOOL enable) noexcept override;
+  STDMETHODIMP UIActivate(UINT state) noexcept override;
+  STDMETHODIMP Refresh() noexcept override;
   STDMETHODIMP CreateViewWindow(IShellView* previous, LPCFOLDERSETTINGS settings, IShellBrowser* browser,
-                                RECT* rect, HWND* out) override;
-  STDMETHODIMP DestroyViewWindow() override;
-  STDMETHODIMP GetCurrentInfo(LPFOLDERSETTINGS settings) override;
-  STDMETHODIMP AddPropertySheetPages(DWORD reserved, LPFNSVADDPROPSHEETPAGE add, LPARAM lParam) override;
-  STDMETHODIMP SaveViewState() override;
-  STDMETHODIMP SelectItem(PCUITEMID_CHILD item, UINT flags) override;
-  STDMETHODIMP GetItemObject(UINT item, REFIID riid, void** ppv) override;
+                                RECT* rect, HWND* out) noexcept override;
+  STDMETHODIMP DestroyViewWindow() noexcept override;
+  STDMETHODIMP GetCurrentInfo(LPFOLDERSETTINGS settings) noexcept override;
+  STDMETHODIMP AddPropertySheetPages(DWORD reserved, LPFNSVADDPROPSHEETPAGE add, LPARAM lParam) noexcept override;
+  STDMETHODIMP SaveViewState() noexcept override;
+  STDMETHODIMP SelectItem(PCUITEMID_CHILD item, UINT flags) noexcept override;
+  STDMETHODIMP GetItemObject(UINT item, REFIID riid, void** ppv) noexcept override;
   // IOleCommandTarget
-  STDMETHODIMP QueryStatus(const GUID* group, ULONG count, OLECMD* commands, OLECMDTEXT* text) override;
-  STDMETHODIMP Exec(const GUID* group, DWORD id, DWORD options, VARIANT* in, VARIANT* out) override;
+  STDMETHODIMP QueryStatus(const GUID* group, ULONG count, OLECMD* commands, OLECMDTEXT* text) noexcept override;
+  STDMETHODIMP Exec(const GUID* group, DWORD id, DWORD options, VARIANT* in, VARIANT* out) noexcept override;
 
   // The one dispatcher of the view's commands, whatever their source. Always 0.
   LRESULT OnCommand(UINT id);
@@ -128,31 +132,30 @@ class CMarlixDLShellView
  private:
   friend LRESULT CALLBACK ViewWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
 
-  // Window (shell_view_window.cpp)
-  LRESULT HandleMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
-  LRESULT OnNotify(NMHDR* header);
-  void OnViewWindowActive();
-  bool CreateListWindow();
-  void ApplyShellSettings();
-  void StartEnumeration();
-  void FillList(IEnumIDList* list);
-  void OnGetDispInfo(NMLVDISPINFOW* info);
-  void ReleaseEnumJob();
-  void SetStatusText();
-  // Modes (shell_view_modes.cpp)
+  // The list (shell_view_list.cpp)
+  // Whether the folder's list has a last id, and that id's type (0 without one).
+  bool HasFolderId();
+  tagPIDLTYPE FolderType();
+  // Empties the list and gives it the column and pictures of the current mode.
   bool InitListColumns();
-  void SetViewMode(UINT mode);
-  void SortByColumn(int column);
+  // Gives the list the pictures of the current mode.
+  void ShowModeImages();
   // Sorts the rows, by the folder's default order or by the process-wide sort state.
   void SortRows(bool bySortColumn);
   void StoreColumnWidths();
-  // Commands (shell_view_commands.cpp)
-  void ActivateUI(UINT state);
-  void DeactivateUI();
-  void OnActivateItem();
-  void ReleaseMergedMenu();
+  // Rows of the selection, in order.
+  std::vector<int> SelectedRows();
+  // A row's item id (null for the add row or a row that is gone).
+  LPCITEMIDLIST RowId(int row);
+  // The view (shell_view.cpp)
+  void StartEnumeration();
+  void ReleaseEnumJob();
+  void SetStatusText();
   // Menus (shell_view_menus.cpp). `merged` places entries in the browser's menus;
   // otherwise each goes at the end of a popup of our own.
+  void ActivateUI(UINT state);
+  void DeactivateUI();
+  void ReleaseMergedMenu();
   void BuildMenus();
   void RefreshMenuStates(HMENU popup);
   UINT EntryState(UINT id);
@@ -167,18 +170,24 @@ class CMarlixDLShellView
   void OnDelete();
   void OnCopy();
   void OnPaste();
-  void OnBeginDrag(NMLISTVIEW* info);
-  // Rows of the selection, in order.
-  std::vector<int> SelectedRows();
-  // A row's item id (null for the add row or a row that is gone).
-  LPCITEMIDLIST RowId(int row);
+  void OnBeginDrag();
   // Adds the full list of every selected row to `data`; the last row handled, or -1.
-  int AddSelection(class CMarlixDLDataObject* data);
-
-  tagPIDLTYPE FolderType();
+  int AddSelection(CMarlixDLDataObject* data);
+  // Commands (shell_view_commands.cpp)
+  void SetViewMode(UINT mode);
+  void SortByColumn(int column);
+  void OnActivateItem();
+  // The window (shell_view_window.cpp)
+  LRESULT HandleMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
+  LRESULT OnNotify(NMHDR* header);
+  void OnViewWindowActive();
+  bool CreateListWindow();
+  void ApplyShellSettings();
+  void FillList();
+  void OnGetDispInfo(NMLVDISPINFOW* info);
 
   UINT UIState = 0;
-  LPITEMIDLIST FolderIdList = nullptr;
+  UniqueIdList FolderIdList;
   FOLDERSETTINGS FolderSettings{FVM_DETAILS, 0};
   com::ComPtr<IShellBrowser> ShellBrowser;
   com::ComPtr<ICommDlgBrowser> CommDlgBrowser;
@@ -186,12 +195,12 @@ class CMarlixDLShellView
   HWND ViewWindow = nullptr;
   HWND ListWindow = nullptr;
   HWND AnimateWindow = nullptr;
-  HMENU MergedMenu = nullptr;
+  win::UniqueMenu MergedMenu;
   com::ComPtr<IShellFolder> ShellFolder;
   CGravonShellFolderBase* FolderBase = nullptr;  // the same object, when it is ours
-  IMalloc* Malloc = nullptr;
+  com::ComPtr<IMalloc> Malloc;
   std::unique_ptr<CPidlMgr> PidlMgr;
-  HIMAGELIST DragImage = nullptr;
+  win::UniqueImageList DragImage;
   POINT DragImagePos{};
   INT_PTR EnumThreadMarker = -1;
   bool RefreshPending = false;  // a refresh came while an enumeration ran
@@ -202,3 +211,6 @@ class CMarlixDLShellView
   LCID ThreadLocale = 0;
   EnumJob* RunningJob = nullptr;  // the enumeration in flight, shared with its thread
 };
+
+// The class object's creator: a view with no folder, which opens on an empty list.
+HRESULT CreateMarlixDLShellView(REFIID riid, void** ppv) noexcept;

@@ -3,8 +3,8 @@
 #include "shell/shell_view.h"
 
 #include "base/boundary.h"
-#include "helpers/win_handles.h"
-#include "server/class_ids.h"
+#include "base/class_ids.h"
+#include "base/win_handles.h"
 
 LRESULT CMarlixDLShellView::OnCommand(UINT id) {
   switch (id) {
@@ -39,7 +39,7 @@ LRESULT CMarlixDLShellView::OnCommand(UINT id) {
   return 0;
 }
 
-STDMETHODIMP CMarlixDLShellView::QueryStatus(const GUID* group, ULONG count, OLECMD* commands, OLECMDTEXT*) {
+STDMETHODIMP CMarlixDLShellView::QueryStatus(const GUID* group, ULONG count, OLECMD* commands, OLECMDTEXT*) noexcept {
   if (group && *group != CLSID_MarlixDLShellFolder && *group != CGID_Explorer && *group != CGID_ShellDocView)
     return OLECMDERR_E_UNKNOWNGROUP;
   if (!commands) return E_POINTER;
@@ -54,7 +54,7 @@ STDMETHODIMP CMarlixDLShellView::QueryStatus(const GUID* group, ULONG count, OLE
 
 // Runs the command for every group: the test below can never refuse one, since no
 // group equals both.
-STDMETHODIMP CMarlixDLShellView::Exec(const GUID* group, DWORD id, DWORD, VARIANT*, VARIANT*) {
+STDMETHODIMP CMarlixDLShellView::Exec(const GUID* group, DWORD id, DWORD, VARIANT*, VARIANT*) noexcept {
   if (group && *group == CGID_Explorer && *group == CGID_ShellDocView) return OLECMDERR_E_UNKNOWNGROUP;
   return boundary::Call([&] {
     OnCommand(id);
@@ -62,28 +62,30 @@ STDMETHODIMP CMarlixDLShellView::Exec(const GUID* group, DWORD id, DWORD, VARIAN
   });
 }
 
-void CMarlixDLShellView::ActivateUI(UINT state) {
-  if (state == UIState) return;
-  DeactivateUI();
-  UIState = state;
-  if (state != SVUIA_DEACTIVATE) BuildMenus();
-}
-
-void CMarlixDLShellView::DeactivateUI() {
-  ReleaseMergedMenu();
-  UIState = SVUIA_DEACTIVATE;
-}
-
-// The browser's own popups in the merged menu are given back before the menu goes: destroyed
-// with it, they would be gone from the browser too.
-void CMarlixDLShellView::ReleaseMergedMenu() {
-  if (!MergedMenu) return;
-  if (ShellBrowser) {
-    ShellBrowser->SetMenuSB(nullptr, nullptr, nullptr);
-    ShellBrowser->RemoveMenusSB(MergedMenu);
+// Only the change to Details enumerates again; the column stays after leaving it.
+void CMarlixDLShellView::SetViewMode(UINT mode) {
+  DWORD style = ListStyleOfMode(mode);
+  if (!style) return;
+  FolderSettings.ViewMode = mode;
+  if (!IsWindow(ListWindow)) return;
+  if (static_cast<DWORD>(GetWindowLongW(ListWindow, GWL_STYLE)) != style) SetWindowLongW(ListWindow, GWL_STYLE, style);
+  SetWindowPos(ListWindow, nullptr, 0, 0, 0, 0,
+               SWP_NOSIZE | SWP_NOMOVE | SWP_NOZORDER | SWP_NOACTIVATE | SWP_SHOWWINDOW);
+  if (mode == FVM_DETAILS) {
+    if (InitListColumns()) StartEnumeration();
+    BuildMenus();
+    return;
   }
-  DestroyMenu(MergedMenu);
-  MergedMenu = nullptr;
+  ShowModeImages();
+  BuildMenus();
+  if (mode != FVM_LIST) SendMessageW(ListWindow, LVM_ARRANGE, LVA_SNAPTOGRID, 0);
+}
+
+// A second click on the same column turns the order round, in every view of the process.
+void CMarlixDLShellView::SortByColumn(int column) {
+  if (column + 1 == SortColumn) SortDirection = -SortDirection;
+  SortColumn = column + 1;
+  SortRows(true);
 }
 
 // Opens the first selected row: a level is browsed into; the virtual file, which no
@@ -106,6 +108,6 @@ void CMarlixDLShellView::OnActivateItem() {
   com::ComPtr<IShellBrowser> browser = ShellBrowser;
   com::ComPtr<ICommDlgBrowser> dialog = CommDlgBrowser;
   // The row's list is freed with the window that browsing destroys: browse with a copy.
-  win::UniqueCoMem<ITEMIDLIST> id(PidlMgr->Copy(reinterpret_cast<LPCITEMIDLIST>(item.lParam)));
+  UniqueIdList id(PidlMgr->Copy(reinterpret_cast<LPCITEMIDLIST>(item.lParam)));
   if (FAILED(browser->BrowseObject(id.Get(), SBSP_RELATIVE)) && dialog) dialog->OnDefaultCommand(this);
 }

@@ -4,35 +4,13 @@
 #include <ole2.h>
 
 #include "base/resource_ids.h"
+#include "base/win_handles.h"
 #include "config/station_dialog.h"
-#include "helpers/win_handles.h"
 #include "shell/shell_folder_base.h"
 #include "shell/shell_view.h"
 #include "store/station_record.h"
 #include "store/string_table.h"
 #include "transfer/data_object.h"
-
-namespace {
-constexpr wchar_t kStationsFormat[] = L"Marlix Total Stations";
-}  // namespace
-
-std::vector<int> CMarlixDLShellView::SelectedRows() {
-  std::vector<int> rows;
-  if (!IsWindow(ListWindow)) return rows;
-  for (int row = -1; (row = static_cast<int>(SendMessageW(ListWindow, LVM_GETNEXTITEM, static_cast<WPARAM>(row),
-                                                          LVNI_SELECTED))) >= 0;)
-    rows.push_back(row);
-  return rows;
-}
-
-LPCITEMIDLIST CMarlixDLShellView::RowId(int row) {
-  LVITEMW item{};
-  item.mask = LVIF_PARAM;
-  item.iItem = row;
-  if (!IsWindow(ListWindow) || !SendMessageW(ListWindow, LVM_GETITEMW, 0, reinterpret_cast<LPARAM>(&item)))
-    return nullptr;
-  return reinterpret_cast<LPCITEMIDLIST>(item.lParam);
-}
 
 // The add row has no id, so it adds the folder's own list: a copy of the folder as an item.
 int CMarlixDLShellView::AddSelection(CMarlixDLDataObject* data) {
@@ -40,8 +18,8 @@ int CMarlixDLShellView::AddSelection(CMarlixDLDataObject* data) {
   if (FolderBase) FolderBase->GetFolderPath(path, MAX_PATH, false);
   int last = -1;
   for (int row : SelectedRows()) {
-    win::UniqueCoMem<ITEMIDLIST> folder(PidlMgr->CreateListFromPath(path));
-    win::UniqueCoMem<ITEMIDLIST> full(PidlMgr->Concatenate(folder.Get(), RowId(row)));
+    UniqueIdList folder(PidlMgr->CreateListFromPath(path));
+    UniqueIdList full(PidlMgr->Concatenate(folder.Get(), RowId(row)));
     if (full) data->AddItem(full.Get());
     last = row;
   }
@@ -65,7 +43,7 @@ void CMarlixDLShellView::OnNewLevel() {
 
 // One sheet after another while they are cancelled: an OK reloads the list, which ends the walk.
 void CMarlixDLShellView::OnProperties() {
-  if (!PidlMgr || !PidlMgr->GetLast(FolderIdList) || !IsWindow(ListWindow)) return;
+  if (!HasFolderId() || !IsWindow(ListWindow)) return;
   if (!SendMessageW(ListWindow, LVM_GETSELECTEDCOUNT, 0, 0)) return;
   com::ComPtr<CMarlixDLShellView> keep(this);
   for (int row = -1; FolderType() == PIDL_ROOT && IsWindow(ListWindow) &&
@@ -88,7 +66,7 @@ void CMarlixDLShellView::OnProperties() {
 
 // No confirmation. In a level's view nothing is deleted, yet the views are told.
 void CMarlixDLShellView::OnDelete() {
-  if (!PidlMgr || !PidlMgr->GetLast(FolderIdList) || !IsWindow(ListWindow)) return;
+  if (!HasFolderId() || !IsWindow(ListWindow)) return;
   if (!SendMessageW(ListWindow, LVM_GETSELECTEDCOUNT, 0, 0)) return;
   if (FolderType() == PIDL_ROOT) {
     for (int row : SelectedRows()) {
@@ -119,7 +97,7 @@ void CMarlixDLShellView::OnCopy() {
 void CMarlixDLShellView::OnPaste() {
   com::ComPtr<IDataObject> clipboard;
   if (FAILED(OleGetClipboard(clipboard.Put())) || !clipboard) return;
-  if (!PidlMgr || !PidlMgr->GetLast(FolderIdList)) return;
+  if (!HasFolderId()) return;
   com::ComPtr<CMarlixDLShellView> keep(this);
   if (FolderType() == PIDL_ROOT) {
     FORMATETC format{static_cast<CLIPFORMAT>(RegisterClipboardFormatW(kStationsFormat)), nullptr, DVASPECT_CONTENT,
@@ -143,7 +121,7 @@ void CMarlixDLShellView::OnPaste() {
 
 // Only a level's view drags: its rows are virtual files, whose contents the receiver
 // asks for inside DoDragDrop, which is where the download dialog runs.
-void CMarlixDLShellView::OnBeginDrag(NMLISTVIEW*) {
+void CMarlixDLShellView::OnBeginDrag() {
   if (FolderType() != PIDL_LEVEL || !IsWindow(ListWindow) || !PidlMgr) return;
   auto data = com::Make<CMarlixDLDataObject>();
   if (!data) return;
@@ -151,13 +129,12 @@ void CMarlixDLShellView::OnBeginDrag(NMLISTVIEW*) {
   if (last < 0) return;
   com::ComPtr<CMarlixDLShellView> keep(this);
   DragImagePos = {};
-  DragImage = reinterpret_cast<HIMAGELIST>(
-      SendMessageW(ListWindow, LVM_CREATEDRAGIMAGE, last, reinterpret_cast<LPARAM>(&DragImagePos)));
+  DragImage.Reset(reinterpret_cast<HIMAGELIST>(
+      SendMessageW(ListWindow, LVM_CREATEDRAGIMAGE, last, reinterpret_cast<LPARAM>(&DragImagePos))));
   ClientToScreen(ListWindow, &DragImagePos);
   POINT hotSpot{0, 0}, cursor{};
   if (GetCursorPos(&cursor)) hotSpot = {DragImagePos.x - cursor.x, DragImagePos.y - cursor.y};
-  data->SetDragImage(DragImage, ListWindow, hotSpot);
-  DragImage = nullptr;  // the data object's now
+  data->SetDragImage(std::move(DragImage), ListWindow, hotSpot);
   DWORD effect = DROPEFFECT_NONE;
   DoDragDrop(data.Get(), data.Get(), DROPEFFECT_COPY, &effect);
 }

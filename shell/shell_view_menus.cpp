@@ -2,6 +2,7 @@
 // States are worked out each time a menu is built, and again each time one of its popups opens.
 #include <utility>
 
+#include "base/boundary.h"
 #include "base/resource_ids.h"
 #include "shell/shell_view.h"
 #include "store/string_table.h"
@@ -41,37 +42,68 @@ HMENU SubMenu(HMENU menu, UINT id) {
 
 }  // namespace
 
+STDMETHODIMP CMarlixDLShellView::UIActivate(UINT state) noexcept {
+  return boundary::Call([&] {
+    if (state == UIState) return S_OK;
+    ActivateUI(state);
+    if (state != SVUIA_DEACTIVATE) SetStatusText();
+    return S_OK;
+  });
+}
+
+void CMarlixDLShellView::ActivateUI(UINT state) {
+  if (state == UIState) return;
+  DeactivateUI();
+  UIState = state;
+  if (state != SVUIA_DEACTIVATE) BuildMenus();
+}
+
+void CMarlixDLShellView::DeactivateUI() {
+  ReleaseMergedMenu();
+  UIState = SVUIA_DEACTIVATE;
+}
+
+// The browser's own popups in the merged menu are given back before the menu goes: destroyed
+// with it, they would be gone from the browser too.
+void CMarlixDLShellView::ReleaseMergedMenu() {
+  if (!MergedMenu) return;
+  if (ShellBrowser) {
+    ShellBrowser->SetMenuSB(nullptr, nullptr, nullptr);
+    ShellBrowser->RemoveMenusSB(MergedMenu.Get());
+  }
+  MergedMenu.Reset();
+}
+
 // Runs at activation and at each mode change of an active view. An inactive view has no menu
 // in the browser: one built then would replace the active view's.
 void CMarlixDLShellView::BuildMenus() {
   if (!ShellBrowser || UIState == SVUIA_DEACTIVATE) return;
-  HMENU menu = CreateMenu();
+  win::UniqueMenu menu(CreateMenu());
   if (!menu) return;
   OLEMENUGROUPWIDTHS widths{};
-  ShellBrowser->InsertMenusSB(menu, &widths);
-  try {
-    if (HMENU file = SubMenu(menu, FCIDM_MENU_FILE)) FillFileMenu(file, true);
-    if (HMENU view = SubMenu(menu, FCIDM_MENU_VIEW)) FillViewMenu(view, true);
-    if (UIState == SVUIA_ACTIVATE_FOCUS) {
-      if (HMENU edit = SubMenu(menu, FCIDM_MENU_EDIT)) {
-        for (int i = GetMenuItemCount(edit) - 1; i >= 0; --i) DeleteMenu(edit, i, MF_BYPOSITION);
-        FillEditMenu(edit, true);
-      }
+  ShellBrowser->InsertMenusSB(menu.Get(), &widths);
+  // Out of memory half way, the browser keeps the menu it shows and gets its popups back.
+  struct GiveBack {
+    IShellBrowser* browser;
+    HMENU menu;
+    ~GiveBack() {
+      if (menu) browser->RemoveMenusSB(menu);
     }
-  } catch (...) {
-    // Out of memory half way: the browser keeps the menu it shows, and gets this one back.
-    ShellBrowser->RemoveMenusSB(menu);
-    DestroyMenu(menu);
-    throw;
+  } giveBack{ShellBrowser.Get(), menu.Get()};
+  if (HMENU file = SubMenu(menu.Get(), FCIDM_MENU_FILE)) FillFileMenu(file, true);
+  if (HMENU view = SubMenu(menu.Get(), FCIDM_MENU_VIEW)) FillViewMenu(view, true);
+  if (UIState == SVUIA_ACTIVATE_FOCUS) {
+    if (HMENU edit = SubMenu(menu.Get(), FCIDM_MENU_EDIT)) {
+      for (int i = GetMenuItemCount(edit) - 1; i >= 0; --i) DeleteMenu(edit, i, MF_BYPOSITION);
+      FillEditMenu(edit, true);
+    }
   }
+  giveBack.menu = nullptr;
   // The menu of the build before is the browser's no more once the new one is set; its
   // own popups go back to it first.
-  HMENU previous = std::exchange(MergedMenu, menu);
-  ShellBrowser->SetMenuSB(menu, nullptr, ViewWindow);
-  if (previous && previous != menu) {
-    ShellBrowser->RemoveMenusSB(previous);
-    DestroyMenu(previous);
-  }
+  win::UniqueMenu previous = std::exchange(MergedMenu, std::move(menu));
+  ShellBrowser->SetMenuSB(MergedMenu.Get(), nullptr, ViewWindow);
+  if (previous) ShellBrowser->RemoveMenusSB(previous.Get());
 }
 
 // A popup about to open gets fresh states in place. Rebuilding the menu bar here would
@@ -122,7 +154,7 @@ bool CMarlixDLShellView::CursorOverLevel() {
 // Select in a file dialog, Open elsewhere, and in the root the level commands. The
 // merged positions give, in the root: separator, Delete, Properties, Open, Create.
 void CMarlixDLShellView::FillFileMenu(HMENU menu, bool merged) {
-  if (!PidlMgr || !PidlMgr->GetLast(FolderIdList)) return;
+  if (!HasFolderId()) return;
   AddEntry(menu, merged, 0, true, kCmdActivate, EntryState(kCmdActivate), MFT_STRING,
            CommDlgBrowser ? IDS_SELECT : IDS_OPEN);
   if (FolderType() != PIDL_ROOT) return;
@@ -153,11 +185,10 @@ void CMarlixDLShellView::FillEditMenu(HMENU menu, bool merged) {
 // The chosen entry comes back as WM_COMMAND. A position of (-1, -1) from the keyboard is
 // used as it is.
 void CMarlixDLShellView::OnContextMenu(int x, int y) {
-  HMENU popup = CreatePopupMenu();
+  win::UniqueMenu popup(CreatePopupMenu());
   if (!popup) return;
-  FillFileMenu(popup, false);
-  if (!IsWindow(ListWindow) || !SendMessageW(ListWindow, LVM_GETSELECTEDCOUNT, 0, 0)) FillViewMenu(popup, false);
-  FillEditMenu(popup, false);
-  TrackPopupMenu(popup, TPM_RIGHTBUTTON, x, y, 0, ViewWindow, nullptr);
-  DestroyMenu(popup);
+  FillFileMenu(popup.Get(), false);
+  if (!IsWindow(ListWindow) || !SendMessageW(ListWindow, LVM_GETSELECTEDCOUNT, 0, 0)) FillViewMenu(popup.Get(), false);
+  FillEditMenu(popup.Get(), false);
+  TrackPopupMenu(popup.Get(), TPM_RIGHTBUTTON, x, y, 0, ViewWindow, nullptr);
 }

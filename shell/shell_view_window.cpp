@@ -1,5 +1,4 @@
-// The view window: its procedure, the list control, and the enumeration that fills it
-// from a worker thread.
+// The view window: its making and unmaking, its procedure and the list control in it.
 #include "shell/shell_view.h"
 
 #include <ole2.h>
@@ -12,44 +11,6 @@
 #include "shell/item_services.h"
 #include "shell/shell_uuids.h"
 #include "transfer/drop_target.h"
-
-namespace {
-
-constexpr DWORD kAnimateStyle = WS_CHILD | WS_VISIBLE | ACS_CENTER | ACS_TRANSPARENT | ACS_AUTOPLAY;
-constexpr DWORD kEnumThreadStack = 0x100000;
-
-// Off the window's thread: asks the folder for its items and posts them to the view.
-// Touches nothing but its job, and keeps the module mapped until it has left it.
-DWORD WINAPI EnumThreadProc(void* parameter) {
-  auto* job = static_cast<EnumJob*>(parameter);
-  SetThreadLocale(job->Locale);
-  IEnumIDList* list = nullptr;
-  if (FAILED(job->Folder->EnumObjects(job->ViewWindow, SHCONTF_FOLDERS | SHCONTF_NONFOLDERS, &list))) list = nullptr;
-  job->Result.store(list);
-  if (!IsWindow(job->ViewWindow) ||
-      !PostMessageW(job->ViewWindow, GetEnumIDListMessage, 0, reinterpret_cast<LPARAM>(list)))
-    job->DropResult();
-  job->Folder->Release();
-  job->Folder = nullptr;
-  HMODULE module = job->Module;
-  job->Release();
-  if (module) FreeLibraryAndExitThread(module, 0);
-  return 0;
-}
-
-}  // namespace
-
-void EnumJob::DropResult() noexcept {
-  if (IEnumIDList* list = Result.exchange(nullptr)) list->Release();
-}
-
-void EnumJob::Release() noexcept {
-  if (--Refs == 0) {
-    DropResult();
-    if (Folder) Folder->Release();
-    delete this;
-  }
-}
 
 LRESULT CALLBACK ViewWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
   if (message == WM_NCCREATE) {
@@ -67,9 +28,79 @@ LRESULT CALLBACK ViewWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM
                               [&] { return view->HandleMessage(window, message, wParam, lParam); });
 }
 
+CMarlixDLShellView::~CMarlixDLShellView() {
+  // A host that never called DestroyViewWindow must not leave a window behind that
+  // would call into a freed object.
+  if (IsWindow(ViewWindow)) {
+    SetWindowLongPtrW(ViewWindow, GWLP_USERDATA, 0);
+    DestroyWindow(ViewWindow);
+  }
+  ReleaseEnumJob();
+  DestroyNotifyWindow(NotifyWindow);
+  ReleaseMergedMenu();
+}
+
+STDMETHODIMP CMarlixDLShellView::CreateViewWindow(IShellView* previous, LPCFOLDERSETTINGS settings,
+                                                  IShellBrowser* browser, RECT* rect, HWND* out) noexcept {
+  if (!out) return E_INVALIDARG;
+  *out = nullptr;
+  if (!browser || !settings || !rect || !IsUsable()) return E_INVALIDARG;
+  if (IsWindow(ViewWindow)) return E_UNEXPECTED;  // one window per view object
+  HINSTANCE module = ModuleInstance();
+  if (!RegisterModuleClass(kViewWindowClass, ViewWindowProc)) return E_FAIL;
+
+  ShellBrowser = com::ComPtr<IShellBrowser>(browser);
+  CommDlgBrowser.Reset();
+  if (FAILED(browser->QueryInterface(IID_ICommDlgBrowser, CommDlgBrowser.PutVoid()))) CommDlgBrowser.Reset();
+  FolderSettings = *settings;
+
+  // A view that follows one of ours keeps its mode; one that follows a foreign view
+  // takes the mode the browser stored for the folder.
+  if (previous) {
+    com::ComPtr<IUnknown> ours;
+    if (SUCCEEDED(previous->QueryInterface(IID_IMarlixDigitalLevelsShellView, ours.PutVoid()))) {
+      previous->GetCurrentInfo(&FolderSettings);
+    } else {
+      com::ComPtr<IStream> stream;
+      if (browser->GetViewStateStream(STGM_READ, stream.Put()) == S_OK && stream) {
+        UINT mode = FolderSettings.ViewMode;
+        ULONG read = 0;
+        if (SUCCEEDED(stream->Read(&mode, sizeof(mode), &read)) && read == sizeof(mode)) FolderSettings.ViewMode = mode;
+      }
+    }
+  }
+
+  browser->SetToolbarItems(nullptr, 0, FCT_MERGE);
+  ParentWindow = nullptr;
+  if (FAILED(browser->GetWindow(&ParentWindow))) ParentWindow = nullptr;
+
+  HWND window = CreateWindowExW(0, kViewWindowClass, nullptr, WS_CHILD | WS_VISIBLE | WS_CLIPSIBLINGS, rect->left,
+                                rect->top, rect->right - rect->left, rect->bottom - rect->top, ParentWindow, nullptr,
+                                module, static_cast<IShellView*>(this));
+  if (!window) {
+    ViewWindow = nullptr;
+    return E_FAIL;
+  }
+  *out = window;
+  Accelerators = LoadAcceleratorsW(module, MAKEINTRESOURCEW(IDR_VIEW_ACCELERATORS));
+  NotifyWindow.ViewWindow = ViewWindow;
+  if (!IsWindow(NotifyWindow.Hidden)) CreateNotifyWindow(NotifyWindow, ViewWindow);
+  return S_OK;
+}
+
+STDMETHODIMP CMarlixDLShellView::DestroyViewWindow() noexcept {
+  com::ComPtr<CMarlixDLShellView> keep(this);  // the window's going may drop the last other reference
+  UIActivate(SVUIA_DEACTIVATE);
+  ReleaseMergedMenu();
+  if (IsWindow(ViewWindow)) DestroyWindow(ViewWindow);
+  ShellBrowser.Reset();
+  CommDlgBrowser.Reset();
+  return S_OK;
+}
+
 LRESULT CMarlixDLShellView::HandleMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
   if (message == GetEnumIDListMessage) {
-    FillList(reinterpret_cast<IEnumIDList*>(lParam));
+    FillList();
     return 0;
   }
   if (message == GlobalNotifyMessage) {
@@ -148,7 +179,7 @@ LRESULT CMarlixDLShellView::OnNotify(NMHDR* header) {
       OnActivateItem();
       break;
     case LVN_BEGINDRAG:
-      OnBeginDrag(reinterpret_cast<NMLISTVIEW*>(header));
+      OnBeginDrag();
       break;
     case HDN_ENDTRACKW:
       StoreColumnWidths();
@@ -174,10 +205,9 @@ void CMarlixDLShellView::OnGetDispInfo(NMLVDISPINFOW* info) {
   if (!ShellFolder || !id) return;
   if ((item.mask & LVIF_TEXT) && item.pszText && item.cchTextMax > 0) {
     STRRET name{};
-    if (SUCCEEDED(ShellFolder->GetDisplayNameOf(id, SHGDN_INFOLDER, &name)) && name.uType == STRRET_WSTR &&
-        name.pOleStr) {
-      lstrcpynW(item.pszText, name.pOleStr, item.cchTextMax);
-      Malloc->Free(name.pOleStr);
+    if (SUCCEEDED(ShellFolder->GetDisplayNameOf(id, SHGDN_INFOLDER, &name)) && name.uType == STRRET_WSTR) {
+      win::UniqueCoMem<wchar_t> text(name.pOleStr);
+      if (text) lstrcpynW(item.pszText, text.Get(), item.cchTextMax);
     }
   }
   if (item.mask & LVIF_IMAGE) {
@@ -203,7 +233,7 @@ bool CMarlixDLShellView::CreateListWindow() {
   ListControl.Subclass(ListWindow);
   // The target holds the view until RevokeDragDrop lets it go in WM_DESTROY.
   if (auto target = com::Make<CMarlixDLDropTargetOnListView>()) {
-    target->SetTarget(ListWindow, this, FolderIdList);
+    target->SetTarget(ListWindow, this, FolderIdList.Get());
     RegisterDragDrop(ListWindow, target.Get());
   }
   return true;
@@ -218,11 +248,10 @@ void CMarlixDLShellView::ApplyShellSettings() {
     DWORD word;
   } flags{};
   flags.word = 0x80;  // classic until the shell says otherwise
-  if (HMODULE shell = LoadLibraryW(L"shell32.dll")) {
+  if (win::UniqueLibrary shell(LoadLibraryW(L"shell32.dll")); shell) {
     using GetSettings = void(WINAPI*)(SHELLFLAGSTATE*, DWORD);
-    if (auto get = reinterpret_cast<GetSettings>(reinterpret_cast<void*>(GetProcAddress(shell, "SHGetSettings"))))
+    if (auto get = reinterpret_cast<GetSettings>(reinterpret_cast<void*>(GetProcAddress(shell.Get(), "SHGetSettings"))))
       get(&flags.state, SSF_DOUBLECLICKINWEBVIEW | SSF_WIN95CLASSIC);
-    FreeLibrary(shell);
   }
   DWORD extended = (!flags.state.fWin95Classic && !flags.state.fDoubleClickInWebView)
                        ? LVS_EX_TRACKSELECT | LVS_EX_ONECLICKACTIVATE | LVS_EX_UNDERLINEHOT
@@ -230,75 +259,22 @@ void CMarlixDLShellView::ApplyShellSettings() {
   SendMessageW(ListWindow, LVM_SETEXTENDEDLISTVIEWSTYLE, 0, extended);
 }
 
-// One thread at a time. A refresh while one runs is remembered, and run once it has ended:
-// its result may already miss a level added or renamed meanwhile.
-void CMarlixDLShellView::StartEnumeration() {
-  if (EnumThreadMarker != -1) {
-    RefreshPending = true;
-    return;
-  }
-  if (!ShellFolder || !IsWindow(ViewWindow)) return;
-  ReleaseEnumJob();
-  // Made before the clip: with no job there is no thread to stop the clip again.
-  auto* job = new (std::nothrow) EnumJob;
-  if (!job) return;
-  if (IsWindow(AnimateWindow)) DestroyWindow(AnimateWindow);
-  AnimateWindow = CreateWindowExW(0, ANIMATE_CLASSW, nullptr, kAnimateStyle, 0, 0, 0, 0, ListWindow,
-                                  reinterpret_cast<HMENU>(static_cast<INT_PTR>(kAnimateWindowId)), ModuleInstance(),
-                                  nullptr);
-  if (AnimateWindow)
-    SendMessageW(AnimateWindow, ACM_OPENW, reinterpret_cast<WPARAM>(ModuleInstance()),
-                 reinterpret_cast<LPARAM>(MAKEINTRESOURCEW(IDR_ENUM_CLIP)));
-  job->ViewWindow = ViewWindow;
-  job->Folder = ShellFolder.Get();
-  job->Folder->AddRef();
-  job->Locale = ThreadLocale;
-  // The thread keeps the module loaded until it has returned out of it.
-  if (!GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS, reinterpret_cast<LPCWSTR>(&EnumThreadProc),
-                          &job->Module))
-    job->Module = nullptr;
-  HANDLE thread = CreateThread(nullptr, kEnumThreadStack, EnumThreadProc, job, 0, nullptr);
-  if (!thread) {
-    if (job->Module) FreeLibrary(job->Module);
-    job->Refs = 1;
-    job->Release();
-    if (IsWindow(AnimateWindow)) DestroyWindow(AnimateWindow);
-    AnimateWindow = nullptr;
-    return;
-  }
-  RunningJob = job;
-  EnumThreadMarker = reinterpret_cast<INT_PTR>(thread);
-  CloseHandle(thread);
-}
-
-void CMarlixDLShellView::ReleaseEnumJob() {
-  if (RunningJob) {
-    RunningJob->DropResult();
-    RunningJob->Release();
-    RunningJob = nullptr;
-  }
-}
-
 // The thread's result arrives: rows for every item, below the add row in the root.
-void CMarlixDLShellView::FillList(IEnumIDList*) {
+void CMarlixDLShellView::FillList() {
   EnumThreadMarker = -1;
   if (IsWindow(AnimateWindow)) DestroyWindow(AnimateWindow);
   AnimateWindow = nullptr;
   // The job's slot, not the message, says what is ours to take: whoever takes it releases it.
-  IEnumIDList* list = RunningJob ? RunningJob->Result.exchange(nullptr) : nullptr;
+  auto list = com::ComPtr<IEnumIDList>::Attach(RunningJob ? RunningJob->Result.exchange(nullptr) : nullptr);
   ReleaseEnumJob();
   if (RefreshPending) {
     // The list is empty since the refresh; a result older than it is not shown.
     RefreshPending = false;
-    if (list) list->Release();
+    list.Reset();
     Refresh();
     return;
   }
-  if (!list) return;
-  if (!IsWindow(ListWindow) || !PidlMgr) {
-    list->Release();
-    return;
-  }
+  if (!list || !IsWindow(ListWindow) || !PidlMgr) return;
   HCURSOR oldCursor = SetCursor(LoadCursorW(nullptr, IDC_WAIT));
   SendMessageW(ListWindow, WM_SETREDRAW, FALSE, 0);
 
@@ -311,24 +287,22 @@ void CMarlixDLShellView::FillList(IEnumIDList*) {
     item.lParam = 0;
     SendMessageW(ListWindow, LVM_INSERTITEMW, 0, reinterpret_cast<LPARAM>(&item));
   }
-  LPITEMIDLIST id = nullptr;
+  UniqueIdList id;
   ULONG fetched = 0;
-  while (list->Next(1, &id, &fetched) == S_OK && fetched) {
+  while (list->Next(1, id.Put(), &fetched) == S_OK && fetched) {
+    // A row owns its copy until LVN_DELETEITEM.
+    UniqueIdList row(PidlMgr->Copy(id.Get()));
     item.iItem = static_cast<int>(SendMessageW(ListWindow, LVM_GETITEMCOUNT, 0, 0));
     item.pszText = LPSTR_TEXTCALLBACKW;
     item.iImage = I_IMAGECALLBACK;
-    item.lParam = reinterpret_cast<LPARAM>(PidlMgr->Copy(id));
-    if (item.lParam && SendMessageW(ListWindow, LVM_INSERTITEMW, 0, reinterpret_cast<LPARAM>(&item)) == -1)
-      PidlMgr->Free(reinterpret_cast<LPCITEMIDLIST>(item.lParam));
-    PidlMgr->Free(id);
-    id = nullptr;
+    item.lParam = reinterpret_cast<LPARAM>(row.Get());
+    if (row && SendMessageW(ListWindow, LVM_INSERTITEMW, 0, reinterpret_cast<LPARAM>(&item)) != -1) row.Release();
   }
   SortRows(false);
 
   SendMessageW(ListWindow, WM_SETREDRAW, TRUE, 0);
   InvalidateRect(ListWindow, nullptr, TRUE);
   UpdateWindow(ListWindow);
-  list->Release();
   SetCursor(oldCursor);
 }
 
@@ -364,3 +338,6 @@ LRESULT CShellViewListWindow::Handle(HWND window, UINT message, WPARAM wParam, L
   }
   return DefSubclassProc(window, message, wParam, lParam);
 }
+
+// Made from outside, a view has no folder until one calls Init: it shows an empty list.
+HRESULT CreateMarlixDLShellView(REFIID riid, void** ppv) noexcept { return com::CreateInstance<CMarlixDLShellView>(riid, ppv); }

@@ -12,31 +12,18 @@ LPITEMIDLIST Advance(LPCITEMIDLIST id, size_t bytes) {
 
 }  // namespace
 
-CGravonPidlManagerBase::CGravonPidlManagerBase() : m_malloc(nullptr) {
-  if (FAILED(SHGetMalloc(&m_malloc))) m_malloc = nullptr;
+CGravonPidlManagerBase::CGravonPidlManagerBase() {
+  if (FAILED(SHGetMalloc(malloc_.Put()))) malloc_.Reset();
 }
 
-CGravonPidlManagerBase::CGravonPidlManagerBase(const CGravonPidlManagerBase& other) : m_malloc(other.m_malloc) {
-  if (m_malloc) m_malloc->AddRef();
-}
-
-CGravonPidlManagerBase& CGravonPidlManagerBase::operator=(const CGravonPidlManagerBase& other) {
-  if (other.m_malloc) other.m_malloc->AddRef();
-  if (m_malloc) m_malloc->Release();
-  m_malloc = other.m_malloc;
-  return *this;
-}
-
-CGravonPidlManagerBase::~CGravonPidlManagerBase() {
-  if (m_malloc) m_malloc->Release();
-}
+CGravonPidlManagerBase::~CGravonPidlManagerBase() = default;
 
 LPITEMIDLIST CGravonPidlManagerBase::Allocate(size_t size) {
-  return m_malloc ? static_cast<LPITEMIDLIST>(m_malloc->Alloc(size)) : nullptr;
+  return malloc_ ? static_cast<LPITEMIDLIST>(malloc_->Alloc(size)) : nullptr;
 }
 
 void CGravonPidlManagerBase::Free(LPCITEMIDLIST list) {
-  if (list && m_malloc) m_malloc->Free(const_cast<LPITEMIDLIST>(list));
+  if (list && malloc_) malloc_->Free(const_cast<LPITEMIDLIST>(list));
 }
 
 UINT CGravonPidlManagerBase::GetSize(LPCITEMIDLIST list) {
@@ -102,10 +89,9 @@ LPITEMIDLIST CGravonPidlManagerBase::CopyParent(LPCITEMIDLIST list) {
   return parent;
 }
 
-bool CGravonPidlManagerBase::Assign(LPITEMIDLIST& slot, LPCITEMIDLIST list) {
+bool CGravonPidlManagerBase::Assign(UniqueIdList& slot, LPCITEMIDLIST list) {
   LPITEMIDLIST copy = Copy(list);
   if (list && !copy) return false;
-  Free(slot);
-  slot = copy;
+  slot.Reset(copy);
   return true;
 }

@@ -6,6 +6,9 @@
 #include <cstdint>
 #include <cstring>
 
+#include "base/com_base.h"
+#include "base/win_handles.h"
+
 enum tagPIDLTYPE : uint32_t {
   PIDL_ROOT = 1,   // the namespace folder itself
   PIDL_LEVEL = 2,  // one digital level, by its name
@@ -23,13 +26,14 @@ struct tagPIDLDATA {
 #pragma pack(pop)
 static_assert(offsetof(tagPIDLDATA, text) == 12, "text lies at offset 14 of an id");
 
+// An owned list: the task allocator is the shell's IMalloc, so its owner frees it as Free does.
+using UniqueIdList = win::UniqueCoMem<ITEMIDLIST>;
+
 // Operations that know nothing of an id beyond its cb. All accept a null list.
 // Every list made here comes from the shell's task allocator and is the caller's to Free.
 class CGravonPidlManagerBase {
  public:
   CGravonPidlManagerBase();
-  CGravonPidlManagerBase(const CGravonPidlManagerBase& other);
-  CGravonPidlManagerBase& operator=(const CGravonPidlManagerBase& other);
   virtual ~CGravonPidlManagerBase();
 
   virtual LPITEMIDLIST CreateRoot() = 0;
@@ -54,7 +58,7 @@ class CGravonPidlManagerBase {
   void Free(LPCITEMIDLIST list);
   // Replaces `slot` by a copy of `list`, freeing what it held; false, with `slot` unchanged,
   // when a non-null list cannot be copied.
-  bool Assign(LPITEMIDLIST& slot, LPCITEMIDLIST list);
+  bool Assign(UniqueIdList& slot, LPCITEMIDLIST list);
   UINT GetCount(LPCITEMIDLIST list);
   // The last id inside the list; null for a null or empty list.
   LPITEMIDLIST GetLast(LPCITEMIDLIST list);
@@ -68,7 +72,7 @@ class CGravonPidlManagerBase {
   LPITEMIDLIST Allocate(size_t size);
 
  private:
-  IMalloc* m_malloc;
+  com::ComPtr<IMalloc> malloc_;
 };
 
 // cb of the id at `id`, read unaligned.

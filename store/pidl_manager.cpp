@@ -4,7 +4,6 @@
 
 namespace {
 
-const wchar_t kRootText[] = L"Marlix Digital Levels";
 // Deliberately not the folder's class id: it is a parsing name only, never resolved.
 const wchar_t kRootParsingName[] = L"::{D8B818CA-E47C-49a1-96A5-C2AA5FB57F15}";
 constexpr UINT kRootParsingNameSize = 41;

@@ -10,6 +10,10 @@
 
 #include "store/pidl_base.h"
 
+// The texts of the namespace's fixed ids: the folder itself, and the virtual file of a level.
+inline constexpr wchar_t kRootText[] = L"Marlix Digital Levels";
+inline constexpr wchar_t kFileText[] = L"file1.tkf";
+
 // A path text cut at every backslash and slash, without empty components.
 std::vector<std::wstring> PathComponents(const wchar_t* path);
 // Component `index` of a path text; empty if there is none.

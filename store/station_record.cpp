@@ -7,7 +7,7 @@
 
 #include <shlwapi.h>
 
-#include "helpers/win_handles.h"
+#include "base/win_handles.h"
 #include "base/resource_ids.h"
 #include "store/string_table.h"
 
@@ -30,9 +30,9 @@ LONG OpenLevelsKey(win::UniqueHKey& key) {
                          key.Put(), nullptr);
 }
 
-}  // namespace
-
-LONG ReadStationString(HKEY key, const wchar_t* value, std::wstring& out) {
+// A string value as every reader of the store takes it: at most 520 bytes, an odd last byte
+// kept as a character of its own, and no terminator needed.
+LONG ReadString(HKEY key, const wchar_t* value, std::wstring& out) {
   // One spare character so that a value stored without its terminator still ends.
   wchar_t buffer[kStringReadBytes / sizeof(wchar_t) + 1] = {};
   DWORD size = kStringReadBytes;
@@ -41,10 +41,6 @@ LONG ReadStationString(HKEY key, const wchar_t* value, std::wstring& out) {
   out.assign(buffer, wcsnlen(buffer, (size + 1) / sizeof(wchar_t)));
   return ERROR_SUCCESS;
 }
-
-namespace {
-
-LONG ReadString(HKEY key, const wchar_t* value, std::wstring& out) { return ReadStationString(key, value, out); }
 
 LONG ReadNumber(HKEY key, const wchar_t* value, int& out) {
   DWORD number = 0, size = sizeof(number);
@@ -198,6 +194,24 @@ void WriteStation(const CStationRecord& r, HKEY key) {
   if (WriteString(key, L"Model", r.Model) != ERROR_SUCCESS) return;
   if (WriteNumber(key, L"Flow", r.Flow) != ERROR_SUCCESS) return;
   WriteNumber(key, L"CheckSum", r.CheckSum);
+}
+
+std::vector<std::wstring> ListStationNames() {
+  std::vector<std::wstring> names;
+  win::UniqueHKey levels;
+  if (OpenLevelsKey(levels) != ERROR_SUCCESS) return names;
+  for (DWORD index = 0;; ++index) {
+    wchar_t keyName[kKeyNameChars];
+    DWORD length = kKeyNameChars;
+    if (RegEnumKeyExW(levels.Get(), index, keyName, &length, nullptr, nullptr, nullptr, nullptr) != ERROR_SUCCESS)
+      return names;
+    // Listing needs no more than reading.
+    win::UniqueHKey level;
+    std::wstring name;
+    if (RegOpenKeyExW(levels.Get(), keyName, 0, KEY_READ, level.Put()) == ERROR_SUCCESS &&
+        ReadString(level.Get(), L"Name", name) == ERROR_SUCCESS)
+      names.push_back(std::move(name));
+  }
 }
 
 HRESULT FindStation(CStationRecord& record, wchar_t* keyName, DWORD* keyNameLength) {

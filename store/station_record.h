@@ -47,12 +47,12 @@ LONG ReadStation(CStationRecord& record, HKEY key);
 // Stops silently at the first value that cannot be written.
 void WriteStation(const CStationRecord& record, HKEY key);
 
+// The names of the stored levels, in the registry's order, as every reader of the store takes
+// them; none if the store can't be opened. Levels without a readable "Name" are not among them.
+std::vector<std::wstring> ListStationNames();
+
 // Finds a level by exact name and fills `record` from the store. With a buffer and a
 // non-zero *keyNameLength, also gives the level's key name and sets the length to its length + 1.
-// A string value as every reader of the store takes it: at most 520 bytes, an odd last
-// byte kept as a character of its own, and no terminator needed.
-LONG ReadStationString(HKEY key, const wchar_t* value, std::wstring& out);
-
 HRESULT FindStation(CStationRecord& record, wchar_t* keyName = nullptr, DWORD* keyNameLength = nullptr);
 // E_INVALIDARG if the name is taken, in which case `record` now holds the stored level;
 // kUnstorableStation, with nothing written, for a record that could not be read back.
@@ -69,7 +69,9 @@ std::wstring FreeCopyName(const std::wstring& name, const std::wstring& prefix);
 // Deletes a key and everything below it. ERROR_BADKEY for an empty name.
 LONG DeleteKeyTree(HKEY parent, const wchar_t* name);
 
-// The clipboard form "Marlix Total Stations": a count, then a size and a packed record each.
+// The private clipboard format of packed levels, and its form: a count, then a size and a
+// packed record each.
+inline constexpr wchar_t kStationsFormat[] = L"Marlix Total Stations";
 // The handle is global memory (0x2042) owned by the caller; null if it could not be made.
 HGLOBAL PackStations(const std::vector<CStationRecord>& records);
 // Appends the records found in the block; stops at the first damaged one. Returns 0.

@@ -8,8 +8,9 @@
 #include "base/resource_ids.h"
 #include "base/window_messages.h"
 #include "store/string_table.h"
-#include "transfer/download_dialog.h"
 
+HWND DownloadDialogWindow = nullptr;
+HWND UploadDialogWindow = nullptr;
 void (*PointsBlockFreeHook)(const PointsBlock* block) = nullptr;
 
 void CommResultCallback(int code) noexcept {

@@ -62,6 +62,11 @@ constexpr int kCommNoError = 0;
 constexpr int kCommTimeout = -101;
 constexpr int kCommInterrupted = -102;
 
+// The open transfer dialogs of the process: the callback's only way to the download dialog.
+// Nothing ever sets the upload handle.
+extern HWND DownloadDialogWindow;
+extern HWND UploadDialogWindow;
+
 // Posts DownloadMessage (wParam 0, lParam the code sign-extended) to the open transfer
 // dialog; does nothing when none is open. May run on any thread.
 void CommResultCallback(int code) noexcept;

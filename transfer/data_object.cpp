@@ -5,8 +5,7 @@
 #include <string>
 
 #include "base/boundary.h"
-#include "helpers/win_handles.h"
-#include "server/class_creators.h"
+#include "base/win_handles.h"
 #include "store/pidl_manager.h"
 #include "store/station_record.h"
 #include "transfer/download_dialog.h"
@@ -16,7 +15,6 @@
 namespace {
 
 constexpr UINT kClipboardFlags = GMEM_MOVEABLE | GMEM_ZEROINIT | GMEM_SHARE;  // 0x2042
-constexpr wchar_t kVirtualFileName[] = L"file1.tkf";
 
 // Registered anew at each use; the request carries the 16-bit number.
 CLIPFORMAT Format(const wchar_t* name) noexcept {
@@ -26,7 +24,7 @@ CLIPFORMAT FileContentsFormat() noexcept { return Format(L"FileContents"); }
 CLIPFORMAT GroupDescriptorFormat() noexcept { return Format(L"FileGroupDescriptorW"); }
 CLIPFORMAT IdListArrayFormat() noexcept { return Format(L"Shell IDList Array"); }
 CLIPFORMAT DropEffectFormat() noexcept { return Format(L"Preferred DropEffect"); }
-CLIPFORMAT StationsFormat() noexcept { return Format(L"Marlix Total Stations"); }
+CLIPFORMAT StationsFormat() noexcept { return Format(kStationsFormat); }
 
 bool IsStreamRequest(const FORMATETC& f, CLIPFORMAT cf) noexcept {
   return f.cfFormat == cf && (f.tymed & TYMED_ISTREAM) != 0;
@@ -48,33 +46,22 @@ void HandOver(STGMEDIUM& medium, HGLOBAL block) noexcept {
 
 }  // namespace
 
-CMarlixDLDataObject::~CMarlixDLDataObject() {
-  CPidlMgr pidl;
-  for (LPITEMIDLIST item : ItemList) pidl.Free(item);
-  // A drag that never reached QueryContinueDrag's clean-up still owes its picture.
-  if (DragImage) ImageList_Destroy(DragImage);
-}
-
 bool CMarlixDLDataObject::AddItem(LPCITEMIDLIST list) {
-  CPidlMgr pidl;
-  LPITEMIDLIST copy = pidl.Copy(list);
+  UniqueIdList copy(CPidlMgr().Copy(list));
   if (!copy) return false;
-  try {
-    ItemList.push_back(copy);
-  } catch (const std::bad_alloc&) {
-    pidl.Free(copy);
-    return false;
-  }
-  return true;
+  return boundary::CallOr(false, [&] {
+    ItemList.push_back(std::move(copy));
+    return true;
+  });
 }
 
-void CMarlixDLDataObject::SetDragImage(HIMAGELIST image, HWND window, POINT hotSpot) noexcept {
-  DragImage = image;
+void CMarlixDLDataObject::SetDragImage(win::UniqueImageList image, HWND window, POINT hotSpot) noexcept {
+  DragImage = std::move(image);
   DragWindow = window;
   DragHotSpot = hotSpot;
 }
 
-STDMETHODIMP CMarlixDLDataObject::GetData(FORMATETC* format, STGMEDIUM* medium) {
+STDMETHODIMP CMarlixDLDataObject::GetData(FORMATETC* format, STGMEDIUM* medium) noexcept {
   if (!format || !medium) return E_INVALIDARG;
   if (TransferDialogOpen()) return E_INVALIDARG;
   const FORMATETC& f = *format;
@@ -110,7 +97,7 @@ HRESULT CMarlixDLDataObject::GetGroupDescriptor(STGMEDIUM& medium) {
     FILEGROUPDESCRIPTORW* group = lock.Get();
     group->cItems = static_cast<UINT>(n);
     // Name only: the receiver learns no size, time or attributes.
-    for (size_t i = 0; i < n; ++i) wcscpy_s(group->fgd[i].cFileName, kVirtualFileName);
+    for (size_t i = 0; i < n; ++i) wcscpy_s(group->fgd[i].cFileName, kFileText);
   }
   HandOver(medium, block);
   return S_OK;
@@ -119,7 +106,7 @@ HRESULT CMarlixDLDataObject::GetGroupDescriptor(STGMEDIUM& medium) {
 HRESULT CMarlixDLDataObject::GetFileContents(LONG index, STGMEDIUM& medium) {
   if (ItemList.empty()) return S_FALSE;
   if (index < 0 || static_cast<size_t>(index) >= ItemList.size()) return S_FALSE;
-  LPCITEMIDLIST item = ItemList[static_cast<size_t>(index)];
+  LPCITEMIDLIST item = ItemList[static_cast<size_t>(index)].Get();
   CPidlMgr pidl;
   if (!pidl.IsFile(item)) return S_FALSE;
 
@@ -143,7 +130,7 @@ HRESULT CMarlixDLDataObject::GetFileContents(LONG index, STGMEDIUM& medium) {
   target += L".txt";
   auto stream = com::Make<CStream2>();
   if (!stream) return E_OUTOFMEMORY;
-  stream->AttachFile(target, kVirtualFileName, true);
+  stream->AttachFile(target, kFileText, true);
   medium.tymed = TYMED_ISTREAM;
   medium.pstm = stream.Detach();
   medium.pUnkForRelease = nullptr;
@@ -153,13 +140,13 @@ HRESULT CMarlixDLDataObject::GetFileContents(LONG index, STGMEDIUM& medium) {
 HRESULT CMarlixDLDataObject::GetIdListArray(STGMEDIUM& medium) {
   if (ItemList.empty()) return S_FALSE;
   CPidlMgr pidl;
-  LPITEMIDLIST parent = pidl.CopyParent(ItemList.front());
+  UniqueIdList parent(pidl.CopyParent(ItemList.front().Get()));
   if (!parent) return S_FALSE;
 
   const size_t n = ItemList.size();
   const UINT tableEnd = static_cast<UINT>(4 * n + 8);
-  SIZE_T size = tableEnd + pidl.GetSize(parent);
-  for (LPCITEMIDLIST item : ItemList) size += pidl.GetSize(pidl.GetLast(item));
+  SIZE_T size = tableEnd + pidl.GetSize(parent.Get());
+  for (const UniqueIdList& item : ItemList) size += pidl.GetSize(pidl.GetLast(item.Get()));
 
   HGLOBAL block = GlobalAlloc(kClipboardFlags, size);
   if (block) {
@@ -169,18 +156,17 @@ HRESULT CMarlixDLDataObject::GetIdListArray(STGMEDIUM& medium) {
     cida->cidl = static_cast<UINT>(n);
     UINT offset = tableEnd;
     cida->aoffset[0] = offset;
-    UINT parentSize = pidl.GetSize(parent);
-    memcpy(base + offset, parent, parentSize);
+    UINT parentSize = pidl.GetSize(parent.Get());
+    memcpy(base + offset, parent.Get(), parentSize);
     offset += parentSize;
     for (size_t i = 0; i < n; ++i) {
-      LPCITEMIDLIST child = pidl.GetLast(ItemList[i]);
+      LPCITEMIDLIST child = pidl.GetLast(ItemList[i].Get());
       UINT childSize = pidl.GetSize(child);
       cida->aoffset[i + 1] = offset;
       if (child) memcpy(base + offset, child, childSize);
       offset += childSize;
     }
   }
-  pidl.Free(parent);
   if (!block) return E_OUTOFMEMORY;
   HandOver(medium, block);
   return S_OK;
@@ -189,9 +175,9 @@ HRESULT CMarlixDLDataObject::GetIdListArray(STGMEDIUM& medium) {
 HRESULT CMarlixDLDataObject::GetStations(STGMEDIUM& medium) {
   CPidlMgr pidl;
   std::vector<CStationRecord> found;
-  for (LPCITEMIDLIST item : ItemList) {
+  for (const UniqueIdList& item : ItemList) {
     wchar_t path[260] = {};
-    pidl.GetPath(item, path, 260);
+    pidl.GetPath(item.Get(), path, 260);
     CStationRecord level;
     level.Name = PathComponent(path, 1);
     // A level gone meanwhile is left out silently.
@@ -203,9 +189,9 @@ HRESULT CMarlixDLDataObject::GetStations(STGMEDIUM& medium) {
   return S_OK;
 }
 
-STDMETHODIMP CMarlixDLDataObject::GetDataHere(FORMATETC*, STGMEDIUM*) { return E_NOTIMPL; }
+STDMETHODIMP CMarlixDLDataObject::GetDataHere(FORMATETC*, STGMEDIUM*) noexcept { return E_NOTIMPL; }
 
-STDMETHODIMP CMarlixDLDataObject::QueryGetData(FORMATETC* format) {
+STDMETHODIMP CMarlixDLDataObject::QueryGetData(FORMATETC* format) noexcept {
   if (!format) return E_INVALIDARG;
   if (TransferDialogOpen()) return E_INVALIDARG;
   const FORMATETC& f = *format;
@@ -217,12 +203,12 @@ STDMETHODIMP CMarlixDLDataObject::QueryGetData(FORMATETC* format) {
   return S_FALSE;
 }
 
-STDMETHODIMP CMarlixDLDataObject::GetCanonicalFormatEtc(FORMATETC*, FORMATETC*) { return E_NOTIMPL; }
+STDMETHODIMP CMarlixDLDataObject::GetCanonicalFormatEtc(FORMATETC*, FORMATETC*) noexcept { return E_NOTIMPL; }
 
 // Accepted and forgotten: the medium stays the caller's.
-STDMETHODIMP CMarlixDLDataObject::SetData(FORMATETC*, STGMEDIUM*, BOOL) { return S_OK; }
+STDMETHODIMP CMarlixDLDataObject::SetData(FORMATETC*, STGMEDIUM*, BOOL) noexcept { return S_OK; }
 
-STDMETHODIMP CMarlixDLDataObject::EnumFormatEtc(DWORD, IEnumFORMATETC** result) {
+STDMETHODIMP CMarlixDLDataObject::EnumFormatEtc(DWORD, IEnumFORMATETC** result) noexcept {
   if (!result) return E_POINTER;
   *result = nullptr;
   // "Preferred DropEffect" is answered on request but deliberately not listed.
@@ -232,23 +218,22 @@ STDMETHODIMP CMarlixDLDataObject::EnumFormatEtc(DWORD, IEnumFORMATETC** result) 
       {IdListArrayFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL},
       {StationsFormat(), nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL},
   };
-  CEnumFormatEtc* list = CEnumFormatEtc::Create(formats, 4);
+  auto list = com::Make<CEnumFormatEtc>(formats, 4);
   if (!list) return E_OUTOFMEMORY;
-  *result = list;
+  *result = list.Detach();
   return S_OK;
 }
 
-STDMETHODIMP CMarlixDLDataObject::DAdvise(FORMATETC*, DWORD, IAdviseSink*, DWORD*) { return E_NOTIMPL; }
-STDMETHODIMP CMarlixDLDataObject::DUnadvise(DWORD) { return E_NOTIMPL; }
-STDMETHODIMP CMarlixDLDataObject::EnumDAdvise(IEnumSTATDATA**) { return E_NOTIMPL; }
+STDMETHODIMP CMarlixDLDataObject::DAdvise(FORMATETC*, DWORD, IAdviseSink*, DWORD*) noexcept { return E_NOTIMPL; }
+STDMETHODIMP CMarlixDLDataObject::DUnadvise(DWORD) noexcept { return E_NOTIMPL; }
+STDMETHODIMP CMarlixDLDataObject::EnumDAdvise(IEnumSTATDATA**) noexcept { return E_NOTIMPL; }
 
-STDMETHODIMP CMarlixDLDataObject::QueryContinueDrag(BOOL escapePressed, DWORD keyState) {
+STDMETHODIMP CMarlixDLDataObject::QueryContinueDrag(BOOL escapePressed, DWORD keyState) noexcept {
   // The picture goes only when nothing at all is held any more.
   if (keyState == 0) {
     ImageList_EndDrag();
     ImageList_DragLeave(DragWindow);
-    ImageList_Destroy(DragImage);
-    DragImage = nullptr;
+    DragImage.Reset();
     DragImageShown = FALSE;
   }
   if (escapePressed) return DRAGDROP_S_CANCEL;
@@ -256,11 +241,11 @@ STDMETHODIMP CMarlixDLDataObject::QueryContinueDrag(BOOL escapePressed, DWORD ke
   return DRAGDROP_S_DROP;
 }
 
-STDMETHODIMP CMarlixDLDataObject::GiveFeedback(DWORD) {
+STDMETHODIMP CMarlixDLDataObject::GiveFeedback(DWORD) noexcept {
   if (!DragImage) return DRAGDROP_S_USEDEFAULTCURSORS;
   if (!DragImageShown) {
     ImageList_DragEnter(DragWindow, 0, 0);
-    ImageList_BeginDrag(DragImage, 0, 0, 0);
+    ImageList_BeginDrag(DragImage.Get(), 0, 0, 0);
     DragImageShown = TRUE;
     return DRAGDROP_S_USEDEFAULTCURSORS;
   }
@@ -277,4 +262,4 @@ STDMETHODIMP CMarlixDLDataObject::GiveFeedback(DWORD) {
   return DRAGDROP_S_USEDEFAULTCURSORS;
 }
 
-HRESULT CreateMarlixDLDataObject(REFIID riid, void** ppv) { return com::CreateInstance<CMarlixDLDataObject>(riid, ppv); }
+HRESULT CreateMarlixDLDataObject(REFIID riid, void** ppv) noexcept { return com::CreateInstance<CMarlixDLDataObject>(riid, ppv); }

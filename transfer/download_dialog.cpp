@@ -6,9 +6,6 @@
 #include "base/window_messages.h"
 #include "store/string_table.h"
 
-HWND DownloadDialogWindow = nullptr;
-HWND UploadDialogWindow = nullptr;
-
 namespace {
 constexpr int kTimeout = 30;
 constexpr int kReceiveWait = 20;

@@ -3,13 +3,9 @@
 #include <windows.h>
 #include <string>
 
-#include "server/dialog_base.h"
+#include "base/dialog_base.h"
 #include "store/station_record.h"
 #include "transfer/comm_interface.h"
-
-// The open transfer dialogs of the process. Nothing ever sets the upload handle.
-extern HWND DownloadDialogWindow;
-extern HWND UploadDialogWindow;
 
 class CDownloadProgressDialog : public CDialog {
  public:

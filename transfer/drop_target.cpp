@@ -3,35 +3,22 @@
 #include <commctrl.h>
 #include <new>
 
-#include "server/class_creators.h"
 
-CMarlixDLDropTarget::CMarlixDLDropTarget() : m_pidlMgr(new (std::nothrow) CPidlMgr) {}
-
-CMarlixDLDropTarget::~CMarlixDLDropTarget() {
-  if (m_pidlMgr) m_pidlMgr->Free(ItemIdList);
-}
+CMarlixDLDropTarget::CMarlixDLDropTarget() : pidlMgr_(new (std::nothrow) CPidlMgr) {}
 
 bool CMarlixDLDropTarget::SetItem(LPCITEMIDLIST fullList) {
-  return m_pidlMgr && m_pidlMgr->Assign(ItemIdList, fullList);
+  return pidlMgr_ && pidlMgr_->Assign(ItemIdList, fullList);
 }
 
 // Nothing is ever uploaded to an instrument: every answer is a refusal, whatever came.
-STDMETHODIMP CMarlixDLDropTarget::DragEnter(IDataObject*, DWORD, POINTL, DWORD*) { return E_INVALIDARG; }
-STDMETHODIMP CMarlixDLDropTarget::DragOver(DWORD, POINTL, DWORD*) { return E_INVALIDARG; }
-STDMETHODIMP CMarlixDLDropTarget::DragLeave() { return E_INVALIDARG; }
-STDMETHODIMP CMarlixDLDropTarget::Drop(IDataObject*, DWORD, POINTL, DWORD*) { return E_INVALIDARG; }
-
-CMarlixDLDropTargetOnListView::~CMarlixDLDropTargetOnListView() {
-  if (ShellView) ShellView->Release();
-}
+STDMETHODIMP CMarlixDLDropTarget::DragEnter(IDataObject*, DWORD, POINTL, DWORD*) noexcept { return E_INVALIDARG; }
+STDMETHODIMP CMarlixDLDropTarget::DragOver(DWORD, POINTL, DWORD*) noexcept { return E_INVALIDARG; }
+STDMETHODIMP CMarlixDLDropTarget::DragLeave() noexcept { return E_INVALIDARG; }
+STDMETHODIMP CMarlixDLDropTarget::Drop(IDataObject*, DWORD, POINTL, DWORD*) noexcept { return E_INVALIDARG; }
 
 void CMarlixDLDropTargetOnListView::SetTarget(HWND listWindow, IShellView* view, LPCITEMIDLIST folderIdList) {
   ListWindow = listWindow;
-  if (view != ShellView) {
-    if (view) view->AddRef();
-    if (ShellView) ShellView->Release();
-    ShellView = view;
-  }
+  if (view != ShellView.Get()) ShellView = com::ComPtr<IShellView>(view);
   FolderIdList = folderIdList;
 }
 
@@ -52,7 +39,7 @@ bool Offers(IDataObject* data, const wchar_t* formatName, CLIPFORMAT format, DWO
 
 // Files on disk, an id array, or both halves of a virtual file: a descriptor alone
 // promises nothing that could be read.
-STDMETHODIMP CMarlixDLDropTargetOnListView::DragEnter(IDataObject* data, DWORD, POINTL, DWORD*) {
+STDMETHODIMP CMarlixDLDropTargetOnListView::DragEnter(IDataObject* data, DWORD, POINTL, DWORD*) noexcept {
   if (!TakesDrops() || !data) return E_INVALIDARG;
   if (Offers(data, nullptr, CF_HDROP, TYMED_HGLOBAL)) return S_OK;
   if (Offers(data, CFSTR_SHELLIDLIST, 0, TYMED_HGLOBAL)) return S_OK;
@@ -77,16 +64,16 @@ int CMarlixDLDropTargetOnListView::SelectRowAt(POINTL point) const {
 }
 
 // Copy whatever the source allowed and whatever keys are held: the drop is refused later.
-STDMETHODIMP CMarlixDLDropTargetOnListView::DragOver(DWORD, POINTL point, DWORD* effect) {
+STDMETHODIMP CMarlixDLDropTargetOnListView::DragOver(DWORD, POINTL point, DWORD* effect) noexcept {
   if (!TakesDrops() || SelectRowAt(point) < 0) return E_INVALIDARG;
   if (effect) *effect = DROPEFFECT_COPY;
   return S_OK;
 }
 
 // The last highlighted row stays selected: the drag's picture of where it would land.
-STDMETHODIMP CMarlixDLDropTargetOnListView::DragLeave() { return S_OK; }
+STDMETHODIMP CMarlixDLDropTargetOnListView::DragLeave() noexcept { return S_OK; }
 
-STDMETHODIMP CMarlixDLDropTargetOnListView::Drop(IDataObject* data, DWORD keyState, POINTL point, DWORD* effect) {
+STDMETHODIMP CMarlixDLDropTargetOnListView::Drop(IDataObject* data, DWORD keyState, POINTL point, DWORD* effect) noexcept {
   if (!TakesDrops() || SelectRowAt(point) < 0) return E_INVALIDARG;
   com::ComPtr<IDropTarget> item;
   HRESULT hr = ShellView->GetItemObject(SVGIO_SELECTION, IID_IDropTarget, item.PutVoid());
@@ -94,7 +81,7 @@ STDMETHODIMP CMarlixDLDropTargetOnListView::Drop(IDataObject* data, DWORD keySta
   return item->Drop(data, keyState, point, effect);
 }
 
-HRESULT CreateMarlixDLDropTarget(REFIID riid, void** ppv) { return com::CreateInstance<CMarlixDLDropTarget>(riid, ppv); }
-HRESULT CreateMarlixDLDropTargetOnListView(REFIID riid, void** ppv) {
+HRESULT CreateMarlixDLDropTarget(REFIID riid, void** ppv) noexcept { return com::CreateInstance<CMarlixDLDropTarget>(riid, ppv); }
+HRESULT CreateMarlixDLDropTargetOnListView(REFIID riid, void** ppv) noexcept {
   return com::CreateInstance<CMarlixDLDropTargetOnListView>(riid, ppv);
 }

@@ -8,43 +8,40 @@
 
 #include <memory>
 
-#include "server/com_base.h"
+#include "base/com_base.h"
 #include "store/pidl_manager.h"
 
 // The target of one item, handed out by the folder: refuses everything.
 class CMarlixDLDropTarget : public com::ComObject<IDropTarget> {
  public:
   CMarlixDLDropTarget();
-  ~CMarlixDLDropTarget() override;
 
   // Keeps a copy of the item's full list; false if it could not be copied.
   bool SetItem(LPCITEMIDLIST fullList);
-  bool IsUsable() const noexcept { return m_pidlMgr != nullptr; }
+  bool IsUsable() const noexcept { return pidlMgr_ != nullptr; }
 
-  STDMETHODIMP DragEnter(IDataObject* data, DWORD keyState, POINTL point, DWORD* effect) override;
-  STDMETHODIMP DragOver(DWORD keyState, POINTL point, DWORD* effect) override;
-  STDMETHODIMP DragLeave() override;
-  STDMETHODIMP Drop(IDataObject* data, DWORD keyState, POINTL point, DWORD* effect) override;
+  STDMETHODIMP DragEnter(IDataObject* data, DWORD keyState, POINTL point, DWORD* effect) noexcept override;
+  STDMETHODIMP DragOver(DWORD keyState, POINTL point, DWORD* effect) noexcept override;
+  STDMETHODIMP DragLeave() noexcept override;
+  STDMETHODIMP Drop(IDataObject* data, DWORD keyState, POINTL point, DWORD* effect) noexcept override;
 
  private:
-  std::unique_ptr<CPidlMgr> m_pidlMgr;
-  LPITEMIDLIST ItemIdList = nullptr;
+  std::unique_ptr<CPidlMgr> pidlMgr_;
+  UniqueIdList ItemIdList;
 };
 
 // The target registered on a view's list control: accepts files, highlights the level
 // row under the pointer and hands a drop to that row's own target.
 class CMarlixDLDropTargetOnListView : public com::ComObject<IDropTarget> {
  public:
-  ~CMarlixDLDropTargetOnListView() override;
-
   // The list borrows the view's own list, so the view must outlive every call: the
   // counted reference on the view sees to that until RevokeDragDrop lets the target go.
   void SetTarget(HWND listWindow, IShellView* view, LPCITEMIDLIST folderIdList);
 
-  STDMETHODIMP DragEnter(IDataObject* data, DWORD keyState, POINTL point, DWORD* effect) override;
-  STDMETHODIMP DragOver(DWORD keyState, POINTL point, DWORD* effect) override;
-  STDMETHODIMP DragLeave() override;
-  STDMETHODIMP Drop(IDataObject* data, DWORD keyState, POINTL point, DWORD* effect) override;
+  STDMETHODIMP DragEnter(IDataObject* data, DWORD keyState, POINTL point, DWORD* effect) noexcept override;
+  STDMETHODIMP DragOver(DWORD keyState, POINTL point, DWORD* effect) noexcept override;
+  STDMETHODIMP DragLeave() noexcept override;
+  STDMETHODIMP Drop(IDataObject* data, DWORD keyState, POINTL point, DWORD* effect) noexcept override;
 
  private:
   // False in a level's own view, and for a target nobody has set up.
@@ -54,6 +51,10 @@ class CMarlixDLDropTargetOnListView : public com::ComObject<IDropTarget> {
   int SelectRowAt(POINTL point) const;
 
   HWND ListWindow = nullptr;
-  IShellView* ShellView = nullptr;
+  com::ComPtr<IShellView> ShellView;
   LPCITEMIDLIST FolderIdList = nullptr;
 };
+
+// The class objects' creators: targets that refuse everything, the list's until it is set up.
+HRESULT CreateMarlixDLDropTarget(REFIID riid, void** ppv) noexcept;
+HRESULT CreateMarlixDLDropTargetOnListView(REFIID riid, void** ppv) noexcept;

@@ -1,9 +1,8 @@
 #include "transfer/enum_format_etc.h"
 
 #include <cstring>
-#include <new>
 
-#include "server/com_base.h"
+#include "base/boundary.h"
 
 namespace {
 
@@ -20,59 +19,25 @@ bool CopyFormat(FORMATETC& to, const FORMATETC& from) noexcept {
 }  // namespace
 
 CEnumFormatEtc::CEnumFormatEtc(const FORMATETC* formats, ULONG count) {
-  com::LockModule();
-  if (!formats || count == 0) return;
-  Formats = new (std::nothrow) FORMATETC[count];
-  if (!Formats) return;
+  if (!formats) return;
+  Formats.reserve(count);
   for (ULONG i = 0; i < count; ++i) {
-    if (!CopyFormat(Formats[i], formats[i])) Formats[i].ptd = nullptr;
+    Entry entry{formats[i], {}};
+    if (!CopyFormat(entry.format, formats[i])) entry.format.ptd = nullptr;
+    entry.device.Reset(entry.format.ptd);
+    Formats.push_back(std::move(entry));
   }
-  Count = count;
 }
 
-CEnumFormatEtc::~CEnumFormatEtc() {
-  for (ULONG i = 0; i < Count; ++i) CoTaskMemFree(Formats[i].ptd);
-  delete[] Formats;
-  com::UnlockModule();
-}
-
-CEnumFormatEtc* CEnumFormatEtc::Create(const FORMATETC* formats, ULONG count) noexcept {
-  auto* made = new (std::nothrow) CEnumFormatEtc(formats, count);
-  if (made && count != 0 && formats && !made->Formats) {
-    made->Release();
-    return nullptr;
-  }
-  return made;
-}
-
-STDMETHODIMP CEnumFormatEtc::QueryInterface(REFIID riid, void** ppv) {
-  if (!ppv) return E_POINTER;
-  if (riid == IID_IUnknown || riid == IID_IEnumFORMATETC) {
-    *ppv = static_cast<IEnumFORMATETC*>(this);
-    AddRef();
-    return S_OK;
-  }
-  *ppv = nullptr;
-  return E_NOINTERFACE;
-}
-
-STDMETHODIMP_(ULONG) CEnumFormatEtc::AddRef() { return ++RefCount; }
-
-STDMETHODIMP_(ULONG) CEnumFormatEtc::Release() {
-  ULONG left = --RefCount;
-  if (left == 0) delete this;
-  return left;
-}
-
-STDMETHODIMP CEnumFormatEtc::Next(ULONG celt, FORMATETC* rgelt, ULONG* fetched) {
-  if (!Formats) return S_FALSE;
+STDMETHODIMP CEnumFormatEtc::Next(ULONG celt, FORMATETC* rgelt, ULONG* fetched) noexcept {
+  if (Formats.empty()) return S_FALSE;
   if (!fetched && celt != 1) return E_POINTER;
   if (fetched) *fetched = 0;
   if (!rgelt) return S_FALSE;
-  if (Position >= Count) return S_FALSE;
+  if (Position >= Formats.size()) return S_FALSE;
   ULONG given = 0;
-  while (given < celt && Position < Count) {
-    if (!CopyFormat(rgelt[given], Formats[Position])) break;
+  while (given < celt && Position < Formats.size()) {
+    if (!CopyFormat(rgelt[given], Formats[Position].format)) break;
     ++given;
     ++Position;
   }
@@ -80,23 +45,27 @@ STDMETHODIMP CEnumFormatEtc::Next(ULONG celt, FORMATETC* rgelt, ULONG* fetched) 
   return S_OK;
 }
 
-STDMETHODIMP CEnumFormatEtc::Skip(ULONG celt) {
-  if (!Formats || static_cast<ULONGLONG>(Position) + celt >= Count) return S_FALSE;
+STDMETHODIMP CEnumFormatEtc::Skip(ULONG celt) noexcept {
+  if (Formats.empty() || static_cast<ULONGLONG>(Position) + celt >= Formats.size()) return S_FALSE;
   Position += celt;
   return S_OK;
 }
 
-STDMETHODIMP CEnumFormatEtc::Reset() {
+STDMETHODIMP CEnumFormatEtc::Reset() noexcept {
   Position = 0;
   return S_OK;
 }
 
-STDMETHODIMP CEnumFormatEtc::Clone(IEnumFORMATETC** clone) {
+STDMETHODIMP CEnumFormatEtc::Clone(IEnumFORMATETC** clone) noexcept {
   if (!clone) return E_POINTER;
   *clone = nullptr;
-  CEnumFormatEtc* copy = Create(Formats, Count);
-  if (!copy) return E_OUTOFMEMORY;
-  copy->Position = Position;
-  *clone = copy;
-  return S_OK;
+  return boundary::Call([&] {
+    std::vector<FORMATETC> formats;
+    for (const Entry& entry : Formats) formats.push_back(entry.format);
+    auto copy = com::Make<CEnumFormatEtc>(formats.data(), static_cast<ULONG>(formats.size()));
+    if (!copy) return E_OUTOFMEMORY;
+    copy->Position = Position;
+    *clone = copy.Detach();
+    return S_OK;
+  });
 }

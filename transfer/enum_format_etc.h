@@ -2,33 +2,27 @@
 #pragma once
 #include <windows.h>
 #include <objidl.h>
+#include <vector>
 
-// Plain reference count, not atomic: an enumerator belongs to one thread at a time.
-// Born with one reference, owned by its maker; holds a module lock while it lives.
-class CEnumFormatEtc : public IEnumFORMATETC {
+#include "base/com_base.h"
+#include "base/win_handles.h"
+
+class CEnumFormatEtc : public com::ComObject<IEnumFORMATETC> {
  public:
-  // Copies the entries (and any target devices they carry).
+  // Copies the entries and the target devices they carry; throws when memory runs out.
   CEnumFormatEtc(const FORMATETC* formats, ULONG count);
-  CEnumFormatEtc(const CEnumFormatEtc&) = delete;
-  CEnumFormatEtc& operator=(const CEnumFormatEtc&) = delete;
 
-  // Null when memory runs out.
-  static CEnumFormatEtc* Create(const FORMATETC* formats, ULONG count) noexcept;
-
-  STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override;
-  STDMETHODIMP_(ULONG) AddRef() override;
-  STDMETHODIMP_(ULONG) Release() override;
-
-  STDMETHODIMP Next(ULONG celt, FORMATETC* rgelt, ULONG* fetched) override;
-  STDMETHODIMP Skip(ULONG celt) override;
-  STDMETHODIMP Reset() override;
-  STDMETHODIMP Clone(IEnumFORMATETC** clone) override;
+  STDMETHODIMP Next(ULONG celt, FORMATETC* rgelt, ULONG* fetched) noexcept override;
+  STDMETHODIMP Skip(ULONG celt) noexcept override;
+  STDMETHODIMP Reset() noexcept override;
+  STDMETHODIMP Clone(IEnumFORMATETC** clone) noexcept override;
 
  private:
-  virtual ~CEnumFormatEtc();
+  struct Entry {
+    FORMATETC format;
+    win::UniqueCoMem<DVTARGETDEVICE> device;  // what format.ptd points at
+  };
 
   ULONG Position = 0;
-  ULONG Count = 0;
-  FORMATETC* Formats = nullptr;
-  ULONG RefCount = 1;
+  std::vector<Entry> Formats;
 };

@@ -4,7 +4,8 @@
 #include <objidl.h>
 #include <string>
 
-#include "server/com_base.h"
+#include "base/com_base.h"
+#include "base/win_handles.h"
 
 // Answers IUnknown and IStream only; ISequentialStream is deliberately not answered.
 class CStream2 : public com::ComObject<IStream> {
@@ -17,28 +18,25 @@ class CStream2 : public com::ComObject<IStream> {
   HRESULT AttachFile(const std::wstring& path, const std::wstring& displayName, bool deleteWhenRead);
 
   // ISequentialStream
-  STDMETHODIMP Read(void* pv, ULONG cb, ULONG* pcbRead) override;
-  STDMETHODIMP Write(const void* pv, ULONG cb, ULONG* pcbWritten) override;
+  STDMETHODIMP Read(void* pv, ULONG cb, ULONG* pcbRead) noexcept override;
+  STDMETHODIMP Write(const void* pv, ULONG cb, ULONG* pcbWritten) noexcept override;
   // IStream
-  STDMETHODIMP Seek(LARGE_INTEGER move, DWORD origin, ULARGE_INTEGER* newPosition) override;
-  STDMETHODIMP SetSize(ULARGE_INTEGER newSize) override;
+  STDMETHODIMP Seek(LARGE_INTEGER move, DWORD origin, ULARGE_INTEGER* newPosition) noexcept override;
+  STDMETHODIMP SetSize(ULARGE_INTEGER newSize) noexcept override;
   STDMETHODIMP CopyTo(IStream* target, ULARGE_INTEGER cb, ULARGE_INTEGER* read,
-                      ULARGE_INTEGER* written) override;
-  STDMETHODIMP Commit(DWORD flags) override;
-  STDMETHODIMP Revert() override;
-  STDMETHODIMP LockRegion(ULARGE_INTEGER offset, ULARGE_INTEGER cb, DWORD type) override;
-  STDMETHODIMP UnlockRegion(ULARGE_INTEGER offset, ULARGE_INTEGER cb, DWORD type) override;
-  STDMETHODIMP Stat(STATSTG* stat, DWORD flags) override;
-  STDMETHODIMP Clone(IStream** clone) override;
-
- protected:
-  // Closes the handle only: a file not read to its end stays on disk.
-  ~CStream2() override;
+                      ULARGE_INTEGER* written) noexcept override;
+  STDMETHODIMP Commit(DWORD flags) noexcept override;
+  STDMETHODIMP Revert() noexcept override;
+  STDMETHODIMP LockRegion(ULARGE_INTEGER offset, ULARGE_INTEGER cb, DWORD type) noexcept override;
+  STDMETHODIMP UnlockRegion(ULARGE_INTEGER offset, ULARGE_INTEGER cb, DWORD type) noexcept override;
+  STDMETHODIMP Stat(STATSTG* stat, DWORD flags) noexcept override;
+  STDMETHODIMP Clone(IStream** clone) noexcept override;
 
  private:
   HANDLE OpenSource() const noexcept;
 
-  HANDLE FileHandle = INVALID_HANDLE_VALUE;
+  // Closed with the object: a file not read to its end stays on disk.
+  win::UniqueFile FileHandle;
   std::wstring SourceFilePath;
   std::wstring DisplayName;
   ULONG FileSize = 0;

@@ -12,9 +12,9 @@
 #include <functional>
 #include <new>
 #include <utility>
-#include "server/class_creators.h"
-#include "server/class_ids.h"
-#include "server/com_base.h"
+#include "shell/shell_folder.h"
+#include "base/class_ids.h"
+#include "base/com_base.h"
 #include "server/object_map.h"
 #include "server/server_module.h"
 #include "shell/shell_test_util.h"

@@ -2,8 +2,8 @@
 #include <shlobj.h>
 #include <string>
 #include <tuple>
-#include "server/class_ids.h"
-#include "server/com_base.h"
+#include "base/class_ids.h"
+#include "base/com_base.h"
 #include "server/object_map.h"
 #include "support/registry_sandbox.h"
 namespace {

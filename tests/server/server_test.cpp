@@ -2,9 +2,9 @@
 #include <span>
 #include <string>
 #include <vector>
-#include "server/class_creators.h"
-#include "server/class_ids.h"
-#include "server/com_base.h"
+#include "shell/shell_folder.h"
+#include "base/class_ids.h"
+#include "base/com_base.h"
 #include "base/resource_ids.h"
 #include "marlix_version.h"
 #include "server/server_module.h"

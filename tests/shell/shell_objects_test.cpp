@@ -6,7 +6,6 @@
 #include <thread>
 #include "base/module_instance.h"
 #include "base/resource_ids.h"
-#include "server/class_creators.h"
 #include "shell/context_menu.h"
 #include "shell/enum_id_list.h"
 #include "shell/extract_icon.h"
@@ -256,15 +255,15 @@ TEST_F(Shell, ImageListsHoldThreePicturesAtBothSizesAndIconsComeFromThem) {
   LoadImageLists();
   LoadImageLists();  // a second load replaces the lists
   ASSERT_TRUE(LargeImageList && SmallImageList);
-  for (auto [list, x, y] : {std::tuple{LargeImageList, SM_CXICON, SM_CYICON},
-                             std::tuple{SmallImageList, SM_CXSMICON, SM_CYSMICON}}) {
+  for (auto [list, x, y] : {std::tuple{LargeImageList.Get(), SM_CXICON, SM_CYICON},
+                             std::tuple{SmallImageList.Get(), SM_CXSMICON, SM_CYSMICON}}) {
     int cx = 0, cy = 0;
     EXPECT_EQ(ImageList_GetImageCount(list), 3);
     ImageList_GetIconSize(list, &cx, &cy);
     EXPECT_EQ(std::make_pair(cx, cy), std::make_pair(GetSystemMetrics(x), GetSystemMetrics(y)));
   }
   // Each place holds its own picture: the icon nearest to each entry is the one meant for it.
-  for (auto [list, x] : {std::pair{LargeImageList, SM_CXICON}, std::pair{SmallImageList, SM_CXSMICON}}) {
+  for (auto [list, x] : {std::pair{LargeImageList.Get(), SM_CXICON}, std::pair{SmallImageList.Get(), SM_CXSMICON}}) {
     const int size = GetSystemMetrics(x);
     for (int place = 0; place < 3; ++place) {
       const auto entry = Pixels(size, [&](HDC dc) { ImageList_Draw(list, place, dc, 0, 0, ILD_NORMAL); });
@@ -273,8 +272,8 @@ TEST_F(Shell, ImageListsHoldThreePicturesAtBothSizesAndIconsComeFromThem) {
   }
   // A picture that can't be loaded keeps its place: the indexes never shift.
   LoadImageLists(GetModuleHandleW(L"kernel32.dll"));
-  EXPECT_EQ(ImageList_GetImageCount(LargeImageList), 3);
-  EXPECT_EQ(ImageList_GetImageCount(SmallImageList), 3);
+  EXPECT_EQ(ImageList_GetImageCount(LargeImageList.Get()), 3);
+  EXPECT_EQ(ImageList_GetImageCount(SmallImageList.Get()), 3);
   LoadImageLists();
   // The index follows the last id; a relative list has no parent id.
   auto icon = com::Make<CMarlixDLExtractIcon>();

@@ -4,8 +4,8 @@
 #include <functional>
 #include <string>
 #include <vector>
-#include "helpers/win_handles.h"
-#include "server/com_base.h"
+#include "base/win_handles.h"
+#include "base/com_base.h"
 #include "store/pidl_manager.h"
 
 using UniqueList = win::UniqueCoMem<ITEMIDLIST>;

@@ -14,7 +14,6 @@
 #include "base/resource_ids.h"
 #include "base/window_messages.h"
 #include "config/sheet_driver.h"
-#include "server/class_creators.h"
 #include "shell/item_services.h"
 #include "shell/shell_folder.h"
 #include "shell/shell_test_util.h"
@@ -283,7 +282,7 @@ TEST_F(View, EachModeHasItsPicturesAndOnlyDetailsEnumeratesAgain) {
     HWND view = Open(root_.Get(), mode);
     const bool large = mode == FVM_ICON || mode == 7;
     EXPECT_EQ(SendMessageW(ListOf(view), LVM_GETIMAGELIST, large ? LVSIL_NORMAL : LVSIL_SMALL, 0),
-              reinterpret_cast<LRESULT>(large ? LargeImageList : SmallImageList)) << mode;
+              reinterpret_cast<LRESULT>(large ? LargeImageList.Get() : SmallImageList.Get())) << mode;
     EXPECT_EQ(Rows(view), kRootRows) << mode;
   }
   EXPECT_EQ(Mode(Last()), 1u) << "the browser is told the mode the view really shows";

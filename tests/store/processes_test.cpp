@@ -6,7 +6,7 @@
 #include <map>
 #include <string>
 #include <vector>
-#include "helpers/win_handles.h"
+#include "base/win_handles.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
 namespace {
@@ -86,9 +86,10 @@ std::vector<std::wstring> StoredNames() {
     DWORD length = 260;
     if (RegEnumKeyExW(levels.Get(), index, key, &length, nullptr, nullptr, nullptr, nullptr) != ERROR_SUCCESS) break;
     win::UniqueHKey level;
-    std::wstring name = L"<no name>";
+    wchar_t name[300] = L"<no name>";
+    DWORD bytes = sizeof(name);
     if (RegOpenKeyExW(levels.Get(), key, 0, KEY_READ, level.Put()) == ERROR_SUCCESS)
-      ReadStationString(level.Get(), L"Name", name);
+      RegGetValueW(level.Get(), nullptr, L"Name", RRF_RT_REG_SZ, nullptr, name, &bytes);
     names.push_back(name);
   }
   return names;

@@ -3,7 +3,7 @@
 #include <string>
 #include <tuple>
 #include <vector>
-#include "helpers/win_handles.h"
+#include "base/win_handles.h"
 #include "store/pidl_manager.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"

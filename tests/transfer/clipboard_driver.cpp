@@ -11,7 +11,7 @@
 #include <cwchar>
 
 #include "data_test_support.h"
-#include "helpers/win_handles.h"
+#include "base/win_handles.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
 #include "transfer/data_object.h"

@@ -6,11 +6,10 @@
 #include <map>
 
 #include "data_test_support.h"
-#include "helpers/win_handles.h"
+#include "base/win_handles.h"
 #include "shell/shell_folder.h"
 #include "store/station_record.h"
 #include "support/registry_sandbox.h"
-#include "server/class_creators.h"
 #include "transfer/data_object.h"
 #include "transfer/download_dialog.h"
 #include "transfer/drop_target.h"
@@ -183,7 +182,7 @@ TEST_F(DataObject, DragPictureIsCleanedOnlyWhenNothingIsHeld) {
   HWND list = CreateWindowExW(0, L"STATIC", L"", WS_POPUP | WS_VISIBLE, 0, 0, 50, 50, nullptr, nullptr, nullptr, nullptr);
   HIMAGELIST image = ImageList_Create(16, 16, ILC_COLOR32, 1, 1);
   ImageList_ReplaceIcon(image, -1, LoadIconW(nullptr, IDI_APPLICATION));
-  obj->SetDragImage(image, list, POINT{-3, -4});
+  obj->SetDragImage(win::UniqueImageList(image), list, POINT{-3, -4});
   POINT at{}, hotSpot{};
   EXPECT_EQ(ImageList_GetDragImage(&at, &hotSpot), nullptr);
   EXPECT_EQ(obj->GiveFeedback(DROPEFFECT_COPY), DRAGDROP_S_USEDEFAULTCURSORS);
@@ -197,7 +196,7 @@ TEST_F(DataObject, DragPictureIsCleanedOnlyWhenNothingIsHeld) {
   EXPECT_EQ(obj->QueryContinueDrag(FALSE, 0), DRAGDROP_S_DROP);
   EXPECT_FALSE(obj->DragImageShown);
   EXPECT_EQ(ImageList_GetDragImage(&at, &hotSpot), nullptr) << "the drag picture has ended";
-  EXPECT_EQ(obj->DragImage, nullptr);
+  EXPECT_FALSE(obj->DragImage);
   EXPECT_EQ(obj->QueryContinueDrag(TRUE, 0), DRAGDROP_S_CANCEL);
   DestroyWindow(list);
 }

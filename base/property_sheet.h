@@ -8,6 +8,8 @@
 #include <string>
 #include <vector>
 
+#include "base/dialog_base.h"
+
 // A combo box control as the platform gives it, attached by data exchange.
 class CComboBox {
  public:
@@ -22,43 +24,18 @@ class CComboBox {
 
 class CPropertySheet;
 
-class CPropertyPage {
+class CPropertyPage : public CDialogWindow {
  public:
   explicit CPropertyPage(UINT templateId) noexcept : templateId_(templateId) {}
-  virtual ~CPropertyPage() = default;
-  CPropertyPage(const CPropertyPage&) = delete;
-  CPropertyPage& operator=(const CPropertyPage&) = delete;
 
-  // Null until the page is first shown, and again once the sheet is gone.
-  HWND Handle() const noexcept { return window_; }
-  // Calls DoDataExchange; false if the page has no window.
-  bool UpdateData(bool toControls);
   // Enables the sheet's Apply button (or clears this page's change mark).
   void SetModified(bool changed = true);
-
- protected:
-  // Called with toControls true to fill the controls, false to read them back.
-  virtual void DoDataExchange(bool toControls);
-  // Fills the controls; the result is WM_INITDIALOG's (TRUE: default focus).
-  virtual BOOL OnInitDialog();
-  // Message map entry: `handler` runs when control `id` sends notification `code`.
-  void MapNotification(int id, UINT code, std::function<void()> handler);
-
-  HWND Item(int id) const noexcept { return GetDlgItem(window_, id); }
 
  private:
   friend class CPropertySheet;
   static INT_PTR CALLBACK PageProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
 
-  struct NotificationEntry {
-    int id;
-    UINT code;
-    std::function<void()> handler;
-  };
-
   UINT templateId_;
-  HWND window_ = nullptr;
-  std::vector<NotificationEntry> notifications_;
 };
 
 class CPropertySheet {

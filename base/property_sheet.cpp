@@ -1,8 +1,7 @@
-#include "server/property_sheet.h"
+#include "base/property_sheet.h"
 
 #include "base/boundary.h"
 #include "base/module_instance.h"
-#include "server/dialog_base.h"
 
 namespace {
 
@@ -10,66 +9,26 @@ namespace {
 // parameter of ours, and modal sheets nest only through their own message loops.
 thread_local CPropertySheet* constructingSheet = nullptr;
 
+constexpr wchar_t kSheetProperty[] = L"MarlixPropertySheet";
+
 }  // namespace
 
 int CComboBox::AddString(const std::wstring& text) const {
   return static_cast<int>(SendMessageW(window_, CB_ADDSTRING, 0, reinterpret_cast<LPARAM>(text.c_str())));
 }
 
-bool CPropertyPage::UpdateData(bool toControls) {
-  if (!window_) return false;
-  DoDataExchange(toControls);
-  return true;
-}
-
 void CPropertyPage::SetModified(bool changed) {
-  HWND sheet = window_ ? GetParent(window_) : nullptr;
+  HWND sheet = Handle() ? GetParent(Handle()) : nullptr;
   if (!sheet) return;
-  SendMessageW(sheet, changed ? PSM_CHANGED : PSM_UNCHANGED, reinterpret_cast<WPARAM>(window_), 0);
+  SendMessageW(sheet, changed ? PSM_CHANGED : PSM_UNCHANGED, reinterpret_cast<WPARAM>(Handle()), 0);
 }
 
-void CPropertyPage::DoDataExchange(bool) {}
-
-BOOL CPropertyPage::OnInitDialog() {
-  UpdateData(true);
-  return TRUE;
-}
-
-void CPropertyPage::MapNotification(int id, UINT code, std::function<void()> handler) {
-  notifications_.push_back({id, code, std::move(handler)});
-}
-
+// The platform hands over its copy of our PROPSHEETPAGEW; the page rides in its lParam.
 INT_PTR CALLBACK CPropertyPage::PageProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
-  return boundary::CallOr<INT_PTR>(FALSE, [&]() -> INT_PTR {
-    CPropertyPage* self;
-    if (message == WM_INITDIALOG) {
-      // The platform hands over its copy of our PROPSHEETPAGEW; the page rides in its lParam.
-      self = reinterpret_cast<CPropertyPage*>(reinterpret_cast<const PROPSHEETPAGEW*>(lParam)->lParam);
-      SetWindowLongPtrW(window, DWLP_USER, reinterpret_cast<LONG_PTR>(self));
-      self->window_ = window;
-    } else {
-      self = reinterpret_cast<CPropertyPage*>(GetWindowLongPtrW(window, DWLP_USER));
-    }
-    if (!self) return FALSE;
-    switch (message) {
-      case WM_INITDIALOG:
-        return self->OnInitDialog();
-      case WM_COMMAND:
-        for (const NotificationEntry& entry : self->notifications_) {
-          if (entry.id == LOWORD(wParam) && entry.code == HIWORD(wParam)) {
-            entry.handler();
-            return TRUE;
-          }
-        }
-        return FALSE;
-      case WM_NCDESTROY:
-        SetWindowLongPtrW(window, DWLP_USER, 0);
-        self->window_ = nullptr;
-        return FALSE;
-      default:
-        return FALSE;
-    }
-  });
+  CDialogWindow* arriving = nullptr;
+  if (message == WM_INITDIALOG && lParam)
+    arriving = reinterpret_cast<CPropertyPage*>(reinterpret_cast<const PROPSHEETPAGEW*>(lParam)->lParam);
+  return Route(arriving, window, message, wParam, lParam);
 }
 
 CPropertySheet::CPropertySheet(UINT captionId, HWND parent, UINT startPage) noexcept
@@ -116,7 +75,7 @@ int CALLBACK CPropertySheet::SheetCallback(HWND window, UINT message, LPARAM) {
     if (message != PSCB_INITIALIZED || !self || self->window_) return 0;
     constructingSheet = nullptr;  // a sheet opened from inside this one finds its own
     self->window_ = window;
-    SetPropW(window, L"MarlixPropertySheet", self);
+    SetPropW(window, kSheetProperty, self);
     self->platformProc_ = reinterpret_cast<WNDPROC>(
         SetWindowLongPtrW(window, GWLP_WNDPROC, reinterpret_cast<LONG_PTR>(SheetProc)));
     self->OnInitDialog();
@@ -125,7 +84,7 @@ int CALLBACK CPropertySheet::SheetCallback(HWND window, UINT message, LPARAM) {
 }
 
 LRESULT CALLBACK CPropertySheet::SheetProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
-  auto* self = static_cast<CPropertySheet*>(GetPropW(window, L"MarlixPropertySheet"));
+  auto* self = static_cast<CPropertySheet*>(GetPropW(window, kSheetProperty));
   if (!self) return DefWindowProcW(window, message, wParam, lParam);  // never: the property lives as long
   WNDPROC platform = self->platformProc_;
   return boundary::CallOr<LRESULT>(0, [&]() -> LRESULT {
@@ -134,7 +93,7 @@ LRESULT CALLBACK CPropertySheet::SheetProc(HWND window, UINT message, WPARAM wPa
         self->OnCommand(wParam, lParam);
         return 0;
       case WM_NCDESTROY:
-        RemovePropW(window, L"MarlixPropertySheet");
+        RemovePropW(window, kSheetProperty);
         SetWindowLongPtrW(window, GWLP_WNDPROC, reinterpret_cast<LONG_PTR>(platform));
         self->window_ = nullptr;
         return CallWindowProcW(platform, window, message, wParam, lParam);

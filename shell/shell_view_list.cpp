@@ -1,4 +1,4 @@
-// The view's four modes, its one column, and sorting by the folder's order.
+// The list control of the view: its four modes, its one column, its rows and their order.
 #include "shell/shell_view.h"
 
 #include "base/resource_ids.h"
@@ -45,13 +45,19 @@ DWORD ListStyleOfMode(UINT mode) noexcept {
   }
 }
 
-// Empties the list and gives it the column and pictures of the current mode.
+bool CMarlixDLShellView::HasFolderId() { return PidlMgr && PidlMgr->GetLast(FolderIdList.Get()); }
+
+tagPIDLTYPE CMarlixDLShellView::FolderType() {
+  LPCITEMIDLIST last = PidlMgr ? PidlMgr->GetLast(FolderIdList.Get()) : nullptr;
+  return last ? CPidlMgr::GetType(last) : tagPIDLTYPE{};
+}
+
 bool CMarlixDLShellView::InitListColumns() {
   if (!IsWindow(ListWindow)) return false;
   SendMessageW(ListWindow, LVM_DELETEALLITEMS, 0, 0);
   while (SendMessageW(ListWindow, LVM_DELETECOLUMN, 0, 0)) {
   }
-  if (!PidlMgr || !PidlMgr->GetLast(FolderIdList)) return false;
+  if (!HasFolderId()) return false;
   if (FolderSettings.ViewMode == FVM_DETAILS) {
     std::wstring name = LoadTranslatedString(IDS_COLUMN_NAME);
     LVCOLUMNW column{};
@@ -62,40 +68,15 @@ bool CMarlixDLShellView::InitListColumns() {
     column.iSubItem = 0;
     SendMessageW(ListWindow, LVM_INSERTCOLUMNW, 0, reinterpret_cast<LPARAM>(&column));
   }
-  if (FolderSettings.ViewMode == FVM_ICON)
-    SendMessageW(ListWindow, LVM_SETIMAGELIST, LVSIL_NORMAL, reinterpret_cast<LPARAM>(LargeImageList));
-  else
-    SendMessageW(ListWindow, LVM_SETIMAGELIST, LVSIL_SMALL, reinterpret_cast<LPARAM>(SmallImageList));
+  ShowModeImages();
   return true;
 }
 
-// Only the change to Details enumerates again; the column stays after leaving it.
-void CMarlixDLShellView::SetViewMode(UINT mode) {
-  DWORD style = ListStyleOfMode(mode);
-  if (!style) return;
-  FolderSettings.ViewMode = mode;
-  if (!IsWindow(ListWindow)) return;
-  if (static_cast<DWORD>(GetWindowLongW(ListWindow, GWL_STYLE)) != style) SetWindowLongW(ListWindow, GWL_STYLE, style);
-  SetWindowPos(ListWindow, nullptr, 0, 0, 0, 0,
-               SWP_NOSIZE | SWP_NOMOVE | SWP_NOZORDER | SWP_NOACTIVATE | SWP_SHOWWINDOW);
-  if (mode == FVM_DETAILS) {
-    if (InitListColumns()) StartEnumeration();
-    BuildMenus();
-    return;
-  }
-  if (mode == FVM_ICON)
-    SendMessageW(ListWindow, LVM_SETIMAGELIST, LVSIL_NORMAL, reinterpret_cast<LPARAM>(LargeImageList));
+void CMarlixDLShellView::ShowModeImages() {
+  if (FolderSettings.ViewMode == FVM_ICON)
+    SendMessageW(ListWindow, LVM_SETIMAGELIST, LVSIL_NORMAL, reinterpret_cast<LPARAM>(LargeImageList.Get()));
   else
-    SendMessageW(ListWindow, LVM_SETIMAGELIST, LVSIL_SMALL, reinterpret_cast<LPARAM>(SmallImageList));
-  BuildMenus();
-  if (mode != FVM_LIST) SendMessageW(ListWindow, LVM_ARRANGE, LVA_SNAPTOGRID, 0);
-}
-
-// A second click on the same column turns the order round, in every view of the process.
-void CMarlixDLShellView::SortByColumn(int column) {
-  if (column + 1 == SortColumn) SortDirection = -SortDirection;
-  SortColumn = column + 1;
-  SortRows(true);
+    SendMessageW(ListWindow, LVM_SETIMAGELIST, LVSIL_SMALL, reinterpret_cast<LPARAM>(SmallImageList.Get()));
 }
 
 void CMarlixDLShellView::SortRows(bool bySortColumn) {
@@ -108,4 +89,22 @@ void CMarlixDLShellView::StoreColumnWidths() {
   if (!IsWindow(ListWindow)) return;
   ColumnWidths[0] = static_cast<int>(SendMessageW(ListWindow, LVM_GETCOLUMNWIDTH, 0, 0));
   ColumnWidths[1] = static_cast<int>(SendMessageW(ListWindow, LVM_GETCOLUMNWIDTH, 1, 0));
+}
+
+std::vector<int> CMarlixDLShellView::SelectedRows() {
+  std::vector<int> rows;
+  if (!IsWindow(ListWindow)) return rows;
+  for (int row = -1; (row = static_cast<int>(SendMessageW(ListWindow, LVM_GETNEXTITEM, static_cast<WPARAM>(row),
+                                                          LVNI_SELECTED))) >= 0;)
+    rows.push_back(row);
+  return rows;
+}
+
+LPCITEMIDLIST CMarlixDLShellView::RowId(int row) {
+  LVITEMW item{};
+  item.mask = LVIF_PARAM;
+  item.iItem = row;
+  if (!IsWindow(ListWindow) || !SendMessageW(ListWindow, LVM_GETITEMW, 0, reinterpret_cast<LPARAM>(&item)))
+    return nullptr;
+  return reinterpret_cast<LPCITEMIDLIST>(item.lParam);
 }

@@ -74,15 +74,15 @@ class ComObject : public Interfaces... {
   ComObject(const ComObject&) = delete;
   ComObject& operator=(const ComObject&) = delete;
 
-  STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override {
+  STDMETHODIMP QueryInterface(REFIID riid, void** ppv) noexcept override {
     if (!ppv) return E_POINTER;
     *ppv = FindInterface(riid);
     if (!*ppv) return E_NOINTERFACE;
     AddRef();
     return S_OK;
   }
-  STDMETHODIMP_(ULONG) AddRef() override { return ++refs_; }
-  STDMETHODIMP_(ULONG) Release() override {
+  STDMETHODIMP_(ULONG) AddRef() noexcept override { return ++refs_; }
+  STDMETHODIMP_(ULONG) Release() noexcept override {
     ULONG left = --refs_;
     if (left == 0) delete this;
     return left;

@@ -184,7 +184,7 @@ bool CDialog::OnCommand(WPARAM wParam, LPARAM) {
   }
 }
 
-INT_PTR CALLBACK CDialog::DialogProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+INT_PTR CALLBACK CDialog::DialogProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) noexcept {
   CDialogWindow* arriving = message == WM_INITDIALOG ? reinterpret_cast<CDialog*>(lParam) : nullptr;
   return Route(arriving, window, message, wParam, lParam);
 }

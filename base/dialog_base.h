@@ -87,7 +87,7 @@ class CDialog : public CDialogWindow {
   bool OnCommand(WPARAM wParam, LPARAM lParam) override;
 
  private:
-  static INT_PTR CALLBACK DialogProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
+  static INT_PTR CALLBACK DialogProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) noexcept;
 
   UINT templateId_;
   HWND parent_;

@@ -24,7 +24,7 @@ void CPropertyPage::SetModified(bool changed) {
 }
 
 // The platform hands over its copy of our PROPSHEETPAGEW; the page rides in its lParam.
-INT_PTR CALLBACK CPropertyPage::PageProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+INT_PTR CALLBACK CPropertyPage::PageProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) noexcept {
   CDialogWindow* arriving = nullptr;
   if (message == WM_INITDIALOG && lParam)
     arriving = reinterpret_cast<CPropertyPage*>(reinterpret_cast<const PROPSHEETPAGEW*>(lParam)->lParam);
@@ -69,7 +69,7 @@ INT_PTR CPropertySheet::DoModal() {
   return endedWithOk_ ? IDOK : IDCANCEL;
 }
 
-int CALLBACK CPropertySheet::SheetCallback(HWND window, UINT message, LPARAM) {
+int CALLBACK CPropertySheet::SheetCallback(HWND window, UINT message, LPARAM) noexcept {
   return boundary::CallOr(0, [&] {
     CPropertySheet* self = constructingSheet;
     if (message != PSCB_INITIALIZED || !self || self->window_) return 0;
@@ -83,7 +83,7 @@ int CALLBACK CPropertySheet::SheetCallback(HWND window, UINT message, LPARAM) {
   });
 }
 
-LRESULT CALLBACK CPropertySheet::SheetProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+LRESULT CALLBACK CPropertySheet::SheetProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) noexcept {
   auto* self = static_cast<CPropertySheet*>(GetPropW(window, kSheetProperty));
   if (!self) return DefWindowProcW(window, message, wParam, lParam);  // never: the property lives as long
   WNDPROC platform = self->platformProc_;

@@ -33,7 +33,7 @@ class CPropertyPage : public CDialogWindow {
 
  private:
   friend class CPropertySheet;
-  static INT_PTR CALLBACK PageProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
+  static INT_PTR CALLBACK PageProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) noexcept;
 
   UINT templateId_;
 };
@@ -59,8 +59,8 @@ class CPropertySheet {
   virtual BOOL OnInitDialog();
 
  private:
-  static int CALLBACK SheetCallback(HWND window, UINT message, LPARAM lParam);
-  static LRESULT CALLBACK SheetProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
+  static int CALLBACK SheetCallback(HWND window, UINT message, LPARAM lParam) noexcept;
+  static LRESULT CALLBACK SheetProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) noexcept;
 
   UINT captionId_;
   HWND parent_;

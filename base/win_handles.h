@@ -102,6 +102,22 @@ class UniqueMedium {
   STGMEDIUM medium_{};
 };
 
+// Holds a slim reader/writer lock exclusively for the life of the guard; a null lock is none.
+class ExclusiveLock {
+ public:
+  explicit ExclusiveLock(SRWLOCK* lock) noexcept : lock_(lock) {
+    if (lock_) AcquireSRWLockExclusive(lock_);
+  }
+  ~ExclusiveLock() {
+    if (lock_) ReleaseSRWLockExclusive(lock_);
+  }
+  ExclusiveLock(const ExclusiveLock&) = delete;
+  ExclusiveLock& operator=(const ExclusiveLock&) = delete;
+
+ private:
+  SRWLOCK* lock_;
+};
+
 // Locks global memory for the life of the guard.
 template <class T>
 class GlobalLockGuard {

@@ -98,11 +98,21 @@ int PortNumberOf(const std::wstring& portText) {
 
 // General page
 
-CStationGeneralPage::CStationGeneralPage(int newLevel, CStationRecord* record)
-    : CPropertyPage(IDD_STATION_GENERAL), NewLevel(newLevel), Record(record) {
-  for (int id : {IDC_STATION_NAME, IDC_STATION_NOTE}) MapNotification(id, EN_CHANGE, [this] { OnChange(); });
-  for (int id : {IDC_STATION_PORT, IDC_STATION_MODEL}) MapNotification(id, CBN_SELCHANGE, [this] { OnChange(); });
+CStationPage::CStationPage(UINT templateId, int newLevel, CStationRecord* record, std::initializer_list<Change> changes)
+    : CPropertyPage(templateId), NewLevel(newLevel), Record(record) {
+  for (const Change& change : changes) MapNotification(change.control, change.code, [this] { OnChange(); });
 }
+
+void CStationPage::OnChange() {
+  if (!NewLevel && !initializing_) SetModified(true);
+}
+
+CStationGeneralPage::CStationGeneralPage(int newLevel, CStationRecord* record)
+    : CStationPage(IDD_STATION_GENERAL, newLevel, record,
+                   {{IDC_STATION_NAME, EN_CHANGE},
+                    {IDC_STATION_NOTE, EN_CHANGE},
+                    {IDC_STATION_PORT, CBN_SELCHANGE},
+                    {IDC_STATION_MODEL, CBN_SELCHANGE}}) {}
 
 void CStationGeneralPage::DoDataExchange(bool toControls) {
   CPropertyPage::DoDataExchange(toControls);
@@ -152,18 +162,17 @@ BOOL CStationGeneralPage::OnInitDialog() {
 }
 
 // Filling the controls sends the same notifications as typing; only the user's changes count.
-void CStationGeneralPage::OnChange() {
-  if (!NewLevel && !initializing_) SetModified(true);
-}
 
 // Advanced page
 
 CStationAdvancedPage::CStationAdvancedPage(int newLevel, CStationRecord* record)
-    : CPropertyPage(IDD_STATION_ADVANCED), NewLevel(newLevel), Record(record) {
-  for (int id : {IDC_STATION_BAUD, IDC_STATION_PARITY, IDC_STATION_DATABITS, IDC_STATION_STOPBITS, IDC_STATION_FLOW,
-                 IDC_STATION_CHECKSUM})
-    MapNotification(id, CBN_SELCHANGE, [this] { OnChange(); });
-}
+    : CStationPage(IDD_STATION_ADVANCED, newLevel, record,
+                   {{IDC_STATION_BAUD, CBN_SELCHANGE},
+                    {IDC_STATION_PARITY, CBN_SELCHANGE},
+                    {IDC_STATION_DATABITS, CBN_SELCHANGE},
+                    {IDC_STATION_STOPBITS, CBN_SELCHANGE},
+                    {IDC_STATION_FLOW, CBN_SELCHANGE},
+                    {IDC_STATION_CHECKSUM, CBN_SELCHANGE}}) {}
 
 void CStationAdvancedPage::DoDataExchange(bool toControls) {
   CPropertyPage::DoDataExchange(toControls);
@@ -224,9 +233,6 @@ BOOL CStationAdvancedPage::OnInitDialog() {
   return result;
 }
 
-void CStationAdvancedPage::OnChange() {
-  if (!NewLevel && !initializing_) SetModified(true);
-}
 
 // The sheet
 

@@ -3,6 +3,7 @@
 // name and writes the record to the store itself.
 #pragma once
 #include <windows.h>
+#include <initializer_list>
 #include <string>
 #include <vector>
 
@@ -17,12 +18,30 @@ int EnumSerialPorts(std::vector<std::wstring>& ports);
 // A2COM7 gives 2); 0 for a name without digits.
 int PortNumberOf(const std::wstring& portText);
 
-class CStationGeneralPage : public CPropertyPage {
+// What both pages share: the record they edit, and marking the page modified when the user
+// changes a control of an existing level (never while the page fills its controls itself).
+class CStationPage : public CPropertyPage {
+ public:
+  int NewLevel;
+  CStationRecord* Record;  // not owned
+
+ protected:
+  struct Change {
+    int control;
+    UINT code;
+  };
+  CStationPage(UINT templateId, int newLevel, CStationRecord* record, std::initializer_list<Change> changes);
+
+  bool initializing_ = false;
+
+ private:
+  void OnChange();
+};
+
+class CStationGeneralPage : public CStationPage {
  public:
   CStationGeneralPage(int newLevel, CStationRecord* record);
 
-  int NewLevel;
-  CStationRecord* Record;  // not owned
   std::wstring NameText;
   std::wstring NoteText;
   std::wstring PortText;
@@ -34,18 +53,12 @@ class CStationGeneralPage : public CPropertyPage {
  protected:
   void DoDataExchange(bool toControls) override;
   BOOL OnInitDialog() override;
-
- private:
-  void OnChange();
-  bool initializing_ = false;
 };
 
-class CStationAdvancedPage : public CPropertyPage {
+class CStationAdvancedPage : public CStationPage {
  public:
   CStationAdvancedPage(int newLevel, CStationRecord* record);
 
-  int NewLevel;
-  CStationRecord* Record;  // not owned
   std::wstring ParityText;
   std::wstring BaudText;
   std::wstring DataBitsText;
@@ -62,10 +75,6 @@ class CStationAdvancedPage : public CPropertyPage {
  protected:
   void DoDataExchange(bool toControls) override;
   BOOL OnInitDialog() override;
-
- private:
-  void OnChange();
-  bool initializing_ = false;
 };
 
 class CStationDialog : public CPropertySheet {

@@ -88,9 +88,25 @@ std::wstring AppVersionFor(const std::wstring& name) {
 }
 
 // Read at the first question, not while the module loads: the host's version block must
-// not be read under the loader lock. The guard of a local static makes it race-free.
+// not be read under the loader lock. One-time initialisation keeps racing callers apart.
+namespace {
+
+INIT_ONCE appNameOnce = INIT_ONCE_STATIC_INIT;
+std::wstring appName;
+
+BOOL CALLBACK ComputeAppName(PINIT_ONCE, PVOID, PVOID*) noexcept {
+  try {
+    appName = AppNameOfExecutable(GetExecutablePath());
+    return TRUE;
+  } catch (...) {
+    return FALSE;  // out of memory: the next question tries again
+  }
+}
+
+}  // namespace
+
 std::wstring GetAppNameW() {
-  static const std::wstring appName = AppNameOfExecutable(GetExecutablePath());
+  InitOnceExecuteOnce(&appNameOnce, ComputeAppName, nullptr, nullptr);
   return appName;
 }
 

@@ -6,26 +6,21 @@ namespace kld::ft {
 
 namespace {
 
-// Sources may come and go on any thread.
+// Sources may come and go on any thread. The lock needs no set-up, so the map is ready
+// before any source of another file's static could register.
 struct SourceMap {
-  SourceMap() { InitializeCriticalSection(&lock); }
-  ~SourceMap() { DeleteCriticalSection(&lock); }
-  CRITICAL_SECTION lock;
+  SRWLOCK lock = SRWLOCK_INIT;
   std::map<std::wstring, CErrorsSourceBase*> sources;
 };
 
-SourceMap& Sources() {
-  static SourceMap map;
-  return map;
-}
+SourceMap sourceMap;
 
-// Set up with the module, so that no source ever races the map's creation.
-[[maybe_unused]] SourceMap& sourcesAtLoad = Sources();
+SourceMap& Sources() { return sourceMap; }
 
 class Locked {
  public:
-  explicit Locked(SourceMap& map) : map_(map) { EnterCriticalSection(&map_.lock); }
-  ~Locked() { LeaveCriticalSection(&map_.lock); }
+  explicit Locked(SourceMap& map) : map_(map) { AcquireSRWLockExclusive(&map_.lock); }
+  ~Locked() { ReleaseSRWLockExclusive(&map_.lock); }
   Locked(const Locked&) = delete;
   Locked& operator=(const Locked&) = delete;
 

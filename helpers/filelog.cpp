@@ -1,24 +1,19 @@
 #include "helpers/filelog.h"
 
-#include <oaidl.h>
-#include <oleauto.h>
-
 #include <atomic>
 #include <cstdarg>
 #include <cstdio>
-#include <iostream>
-#include <mutex>
-#include <vector>
+#include <string_view>
 
 #include "base/boundary.h"
-#include "base/com_base.h"
 #include "base/win_handles.h"
-#include "helpers/error_reporter.h"
+#include "helpers/format_text.h"
 
 namespace kld::ft {
 
 namespace test_only {
 void (*BeforeFilelogRetry)() = nullptr;
+void (*RestoreStreams)() = nullptr;
 }
 
 namespace {
@@ -27,69 +22,34 @@ win::UniqueFile logFile;
 std::string logPath;
 std::atomic<unsigned> outputMode{3};
 std::atomic<unsigned> logLevel{255};
-std::mutex logMutex;
+SRWLOCK logMutex = SRWLOCK_INIT;
 
-CFilelogStreamBufferT<char> clogBuffer;
-CFilelogStreamBufferT<wchar_t> wclogBuffer;
-std::streambuf* savedClog = nullptr;
-std::wstreambuf* savedWclog = nullptr;
-
-// The streams outlive this module's buffers: give them back before those go.
-struct StreamGuard {
-  ~StreamGuard() { RestoreLogStreams(); }
-} streamGuard;
-
-void WriteRaw(HANDLE target, const std::string& bytes) {
+void WriteRaw(HANDLE target, std::string_view bytes) {
   DWORD written = 0;
   WriteFile(target, bytes.data(), static_cast<DWORD>(bytes.size()), &written, nullptr);
 }
 
-std::string FormatA(const char* format, va_list args) {
-  if (!format) return {};
-  va_list copy;
-  va_copy(copy, args);
-  int length = std::vsnprintf(nullptr, 0, format, copy);
-  va_end(copy);
-  if (length <= 0) return {};
-  std::string text(static_cast<size_t>(length) + 1, '\0');
-  std::vsnprintf(text.data(), text.size(), format, args);
-  text.resize(static_cast<size_t>(length));
-  return text;
-}
-
-std::wstring FormatW(const wchar_t* format, va_list args) {
-  if (!format) return {};
-  std::vector<wchar_t> buffer(256);
-  for (;;) {
-    va_list copy;
-    va_copy(copy, args);
-    int length = std::vswprintf(buffer.data(), buffer.size(), format, copy);
-    va_end(copy);
-    if (length >= 0) return std::wstring(buffer.data(), static_cast<size_t>(length));
-    if (buffer.size() >= (1u << 24)) return {};
-    buffer.resize(buffer.size() * 4);
+// A continuation line is indented by the prefix's width; writing needs no memory.
+void WriteBlanks(HANDLE target, size_t count) {
+  static constexpr char kBlanks[] = "                                ";
+  for (size_t step; count; count -= step) {
+    step = count < sizeof kBlanks - 1 ? count : sizeof kBlanks - 1;
+    WriteRaw(target, std::string_view(kBlanks, step));
   }
 }
 
-std::wstring SystemDescription(HRESULT code) {
-  win::UniqueLocal buffer;
-  DWORD length = FormatMessageW(FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_ALLOCATE_BUFFER |
-                                    FORMAT_MESSAGE_IGNORE_INSERTS,
-                                nullptr, static_cast<DWORD>(code), 0, reinterpret_cast<LPWSTR>(buffer.Put()), 0, nullptr);
-  std::wstring text(buffer && length ? std::wstring(static_cast<const wchar_t*>(buffer.Get()), length) : std::wstring());
-  text.resize(text.size() >= 2 ? text.size() - 2 : 0);
-  return text;
-}
-
-std::wstring ErrorInfoDescription() {
-  com::ComPtr<IErrorInfo> info;
-  if (GetErrorInfo(0, info.Put()) != S_OK || !info) return {};
-  win::UniqueBstr description;
-  if (FAILED(info->GetDescription(description.Put())) || !description) return {};
-  return std::wstring(description.Get(), SysStringLen(description.Get()));
-}
 
 }  // namespace
+
+std::string FormatTextV(const char* format, va_list args) { return format_detail::FormatV(format, args); }
+
+std::string FormatText(const char* format, ...) {
+  va_list args;
+  va_start(args, format);
+  std::string text = FormatTextV(format, args);
+  va_end(args);
+  return text;
+}
 
 std::string NarrowText(const std::wstring& text) {
   if (text.empty()) return {};
@@ -105,36 +65,38 @@ std::string NarrowText(const std::wstring& text) {
 std::string LogEntryPrefix() {
   SYSTEMTIME time;
   GetSystemTime(&time);
-  char prefix[64];
-  std::snprintf(prefix, sizeof prefix, "%02u:%02u:%02u.%04u %6u ", time.wHour, time.wMinute,
-                time.wSecond, time.wMilliseconds, static_cast<unsigned>(GetCurrentThreadId()));
-  return prefix;
+  return FormatText("%02u:%02u:%02u.%04u %6u ", time.wHour, time.wMinute, time.wSecond, time.wMilliseconds,
+                    static_cast<unsigned>(GetCurrentThreadId()));
 }
 
 void WriteLogEntry(const std::string& prefix, const std::string& text) {
-  boundary::CallVoid([&] {
-    std::vector<std::string> lines;
-    size_t begin = 0;
-    while (begin < text.size()) {
-      size_t end = text.find_first_of("\r\n", begin);
-      if (end == std::string::npos) end = text.size();
-      if (end > begin) lines.push_back(text.substr(begin, end - begin));
-      begin = end + 1;
-    }
-    if (lines.empty()) return;
-    const unsigned mode = outputMode.load();
-    const std::string indent(prefix.size(), ' ');
-    std::lock_guard<std::mutex> lock(logMutex);
-    HANDLE console = GetStdHandle(STD_OUTPUT_HANDLE);
-    for (size_t i = 0; i < lines.size(); ++i) {
-      const std::string line = lines[i] + "\r\n";
+  const unsigned mode = outputMode.load();
+  win::ExclusiveLock lock(&logMutex);
+  HANDLE console = GetStdHandle(STD_OUTPUT_HANDLE);
+  bool first = true;
+  for (size_t begin = 0; begin < text.size();) {
+    size_t end = text.find_first_of("\r\n", begin);
+    if (end == std::string::npos) end = text.size();
+    if (end > begin) {
+      // Empty lines are dropped; every other line gets the prefix or its width of blanks.
+      const std::string_view line(text.data() + begin, end - begin);
       if (mode & 1) {
-        WriteRaw(logFile.Get(), i == 0 ? prefix : indent);
+        if (first) {
+          WriteRaw(logFile.Get(), prefix);
+        } else {
+          WriteBlanks(logFile.Get(), prefix.size());
+        }
         WriteRaw(logFile.Get(), line);
+        WriteRaw(logFile.Get(), "\r\n");
       }
-      if (mode & 4) WriteRaw(console, line);
+      if (mode & 4) {
+        WriteRaw(console, line);
+        WriteRaw(console, "\r\n");
+      }
+      first = false;
     }
-  });
+    begin = end + 1;
+  }
 }
 
 bool StartFilelog(const wchar_t* name, bool restart) {
@@ -156,7 +118,9 @@ bool StartFilelog(const wchar_t* name, bool restart) {
   }
   CreateDirectoryW(folder.c_str(), nullptr);
 
-  const std::wstring path = folder + base + L"_" + std::to_wstring(GetCurrentProcessId()) + L".log";
+  wchar_t processId[16] = {};
+  _ultow(GetCurrentProcessId(), processId, 10);
+  const std::wstring path = folder + base + L"_" + processId + L".log";
   const auto create = [&] {
     logFile.Reset(CreateFileW(path.c_str(), GENERIC_WRITE, FILE_SHARE_READ, nullptr, CREATE_ALWAYS,
                               FILE_ATTRIBUTE_NORMAL, nullptr));
@@ -172,67 +136,18 @@ bool StartFilelog(const wchar_t* name, bool restart) {
 }
 
 void StopFilelog() {
-  RestoreLogStreams();
+  if (test_only::RestoreStreams) test_only::RestoreStreams();
   logFile.Reset();
 }
 
 std::string FilelogPath() { return logPath; }
 
-void RedirectLogStreams() {
-  if (!savedClog) savedClog = std::clog.rdbuf(&clogBuffer);
-  if (!savedWclog) savedWclog = std::wclog.rdbuf(&wclogBuffer);
-}
-
-void RestoreLogStreams() {
-  if (savedClog) std::clog.rdbuf(savedClog);
-  if (savedWclog) std::wclog.rdbuf(savedWclog);
-  savedClog = nullptr;
-  savedWclog = nullptr;
-}
-
-void WriteLogText(const std::string& text) { WriteLogEntry(LogEntryPrefix(), text); }
-
-void WriteLogText(const std::wstring& text) { WriteLogEntry(LogEntryPrefix(), NarrowText(text)); }
-
 void LogTextA(const char* format, ...) {
   if (!logFile) return;
   va_list args;
   va_start(args, format);
-  boundary::CallVoid([&] { WriteLogEntry(LogEntryPrefix(), FormatA(format, args)); });
+  boundary::CallVoid([&] { WriteLogEntry(LogEntryPrefix(), FormatTextV(format, args)); });
   va_end(args);
-}
-
-void LogTextW(const wchar_t* format, ...) {
-  va_list args;
-  va_start(args, format);
-  boundary::CallVoid([&] { WriteLogEntry(LogEntryPrefix(), NarrowText(FormatW(format, args))); });
-  va_end(args);
-}
-
-void LogError(const char* file, int line, const wchar_t* text, HRESULT code, ...) {
-  va_list args;
-  va_start(args, code);
-  const std::wstring message = boundary::CallOr(std::wstring(), [&] { return FormatW(text ? text : L"", args); });
-  va_end(args);
-  boundary::CallVoid([&] {
-    char head[64];
-    std::snprintf(head, sizeof head, " - 0x%08X (", static_cast<unsigned>(code));
-    std::string entry = NarrowText(message) + head + (file ? file : "") + ", " +
-                        std::to_string(line) + ")";
-    std::wstring internal;
-    for (size_t i = 0; i < ErrorReporterCount() && internal.empty(); ++i) {
-      internal = ErrorReporterAt(i)->GetErrorText(code, nullptr, nullptr, nullptr);
-    }
-    const std::pair<const char*, std::wstring> details[] = {
-        {"\r\nInternal description: ", internal},
-        {"\r\nSystem description: ", SystemDescription(code)},
-        {"\r\nIErrorInfo description: ", ErrorInfoDescription()},
-    };
-    for (const auto& [label, description] : details) {
-      if (!description.empty()) entry += label + NarrowText(description);
-    }
-    WriteLogEntry(LogEntryPrefix(), entry);
-  });
 }
 
 unsigned SetFilelogMode(unsigned mode) { return outputMode.exchange(mode); }

@@ -2,6 +2,7 @@
 // temporary folder, closed unless a component starts it.
 #pragma once
 #include <windows.h>
+#include <cstdarg>
 #include <streambuf>
 #include <string>
 
@@ -15,6 +16,7 @@ void StopFilelog();
 std::string FilelogPath();
 
 // Puts log buffers under std::clog and std::wclog; StopFilelog restores the former ones.
+// Only the tests use them, so they live in the support library, outside the module.
 void RedirectLogStreams();
 void RestoreLogStreams();
 
@@ -35,6 +37,11 @@ unsigned GetFilelogLevel();
 void WriteLogEntry(const std::string& prefix, const std::string& text);
 std::string LogEntryPrefix();
 std::string NarrowText(const std::wstring& text);
+// printf-style text; wide strings in either width's format take %ls, narrow ones %hs.
+std::string FormatText(const char* format, ...);
+std::wstring FormatText(const wchar_t* format, ...);
+std::string FormatTextV(const char* format, va_list args);
+std::wstring FormatTextV(const wchar_t* format, va_list args);
 // One entry with the current time, whether or not a file is open.
 void WriteLogText(const std::string& text);
 void WriteLogText(const std::wstring& text);
@@ -70,12 +77,16 @@ class CFilelogStreamBufferT : public std::basic_streambuf<Char> {
 namespace test_only {
 // Called between the two attempts to create the log file.
 extern void (*BeforeFilelogRetry)();
+// Set by RedirectLogStreams for StopFilelog: a module that never redirects links no stream code.
+extern void (*RestoreStreams)();
 }  // namespace test_only
 
 // Header of machine and process facts.
 void DumpSystemInfo();
 void DumpLocaleInfo();
 void DumpProcessMemoryInfo();
+// "Version of module '<path>' is '<a.b.c.d>'", from the module's version resource.
+void DumpModuleVersion(HMODULE module);
 // "1.5Mb"-style sizes: divided by 1024 while above, unit from "KMGTPEZY".
 std::string FormatByteSize(double bytes, const char* format = "%0.2f%sb");
 

@@ -27,4 +27,8 @@ struct CStackDumpRequest {
 // that thread may hold (the default one takes the log's lock).
 void DumpThreadStack(const CStackDumpRequest& request);
 
+// A listener for the module's edge (boundary::failureSink): the failure as an error entry of
+// the log, then the stack of the thread that it stopped in.
+void LogBoundaryFailure(const char* what, HRESULT answer, const char* file, int line) noexcept;
+
 }  // namespace kld::ft

@@ -1,6 +1,5 @@
 // The log's header of machine and process facts.
 #include <windows.h>
-#include <psapi.h>
 
 #include <cstdio>
 #include <ctime>
@@ -13,16 +12,6 @@
 namespace kld::ft {
 
 namespace {
-
-std::string Format(const char* format, ...) {
-  char buffer[1024];
-  va_list args;
-  va_start(args, format);
-  int length = std::vsnprintf(buffer, sizeof buffer, format, args);
-  va_end(args);
-  if (length < 0) return {};
-  return std::string(buffer, static_cast<size_t>(length) < sizeof buffer ? length : sizeof buffer - 1);
-}
 
 std::wstring RegistryText(const wchar_t* path, const wchar_t* value) {
   wchar_t buffer[260] = {};
@@ -44,13 +33,13 @@ void DumpOperatingSystem() {
   const wchar_t* key = L"SOFTWARE\\Microsoft\\Windows NT\\CurrentVersion";
   std::wstring product = RegistryText(key, L"ProductName");
   std::string text = "Operating system: " + NarrowText(product.empty() ? L"Windows" : product) +
-                     Format("\nVersion %lu.%lu build %lu %s", version.dwMajorVersion,
+                     FormatText("\nVersion %lu.%lu build %lu %s", version.dwMajorVersion,
                             version.dwMinorVersion, version.dwBuildNumber,
                             NarrowText(version.szCSDVersion).c_str());
   WriteLogText(text);
   int cleanBoot = GetSystemMetrics(SM_CLEANBOOT);
   if (cleanBoot > 0) {
-    WriteLogText(Format("System started in Safe Mode%s", cleanBoot == 2 ? " with network support" : ""));
+    WriteLogText(FormatText("System started in Safe Mode%s", cleanBoot == 2 ? " with network support" : ""));
   }
 }
 
@@ -58,9 +47,9 @@ void DumpDisplay() {
   HDC screen = GetDC(nullptr);
   int dpi = screen ? GetDeviceCaps(screen, LOGPIXELSX) : 0;
   if (screen) ReleaseDC(nullptr, screen);
-  WriteLogText(Format("Screen resolution: %ux%u. DPI: %i", GetSystemMetrics(SM_CXSCREEN),
+  WriteLogText(FormatText("Screen resolution: %ux%u. DPI: %i", GetSystemMetrics(SM_CXSCREEN),
                       GetSystemMetrics(SM_CYSCREEN), dpi));
-  WriteLogText(Format("Virtual screen resolution: %ux%u", GetSystemMetrics(SM_CXVIRTUALSCREEN),
+  WriteLogText(FormatText("Virtual screen resolution: %ux%u", GetSystemMetrics(SM_CXVIRTUALSCREEN),
                       GetSystemMetrics(SM_CYVIRTUALSCREEN)));
 }
 
@@ -73,7 +62,7 @@ void DumpDisks() {
     ULARGE_INTEGER available{}, total{}, free{};
     if (!GetDiskFreeSpaceExW(drive, &available, &total, &free)) continue;
     const std::string name = NarrowText(drive);
-    WriteLogText(Format("Hard disk '%s' space: %s of %s", name.c_str(),
+    WriteLogText(FormatText("Hard disk '%s' space: %s of %s", name.c_str(),
                         FormatByteSize(static_cast<double>(free.QuadPart), "%0.2f%sb").c_str(),
                         FormatByteSize(static_cast<double>(total.QuadPart), "%0.2f%sb").c_str()));
     DWORD flags = 0;
@@ -83,7 +72,7 @@ void DumpDisks() {
     if (flags & FILE_SEQUENTIAL_WRITE_ONCE) names += "FILE_SEQUENTIAL_WRITE_ONCE ";
     if (!names.empty()) {
       names.pop_back();
-      WriteLogText(Format("Hard disk '%s' has follow flags: %s", name.c_str(), names.c_str()));
+      WriteLogText(FormatText("Hard disk '%s' has follow flags: %s", name.c_str(), names.c_str()));
     }
   }
 }
@@ -92,71 +81,42 @@ void DumpDateTimeInfo() {
   char stamp[128] = {};
   std::time_t now = std::time(nullptr);
   if (const std::tm* local = std::localtime(&now)) std::strftime(stamp, sizeof stamp, "%X %x", local);
-  WriteLogText(Format("Local time: %s", stamp));
+  WriteLogText(FormatText("Local time: %s", stamp));
   TIME_ZONE_INFORMATION zone{};
   GetTimeZoneInformation(&zone);
   const long offset = -zone.Bias;  // minutes east of UTC
   const unsigned magnitude = static_cast<unsigned>(offset < 0 ? -offset : offset);
-  WriteLogText(Format("User time zone is '%s' (UTC %s%02u:%02u)", NarrowText(zone.StandardName).c_str(),
+  WriteLogText(FormatText("User time zone is '%s' (UTC %s%02u:%02u)", NarrowText(zone.StandardName).c_str(),
                       offset < 0 ? "-" : "+", magnitude / 60, magnitude % 60));
 }
 
 }  // namespace
-
-std::string FormatByteSize(double bytes, const char* format) {
-  static const char kUnits[] = "KMGTPEZY";
-  int steps = 0;
-  while (bytes >= 1024 && steps < 10) {
-    bytes /= 1024;
-    ++steps;
-  }
-  std::string unit = steps == 0 ? "" : std::string(1, kUnits[steps <= 8 ? steps - 1 : 7]);
-  return Format(format, bytes, unit.c_str());
-}
 
 void DumpSystemInfo() {
   DumpOperatingSystem();
   wchar_t language[LOCALE_NAME_MAX_LENGTH] = {};
   GetLocaleInfoW(MAKELCID(GetUserDefaultUILanguage(), SORT_DEFAULT), LOCALE_SNAME, language,
                  LOCALE_NAME_MAX_LENGTH);
-  WriteLogText(Format("Default UI language for current user is '%s'", NarrowText(language).c_str()));
+  WriteLogText(FormatText("Default UI language for current user is '%s'", NarrowText(language).c_str()));
   SYSTEM_INFO system{};
   GetNativeSystemInfo(&system);
   if (system.dwNumberOfProcessors) {
-    WriteLogText(Format("Number of concurrent threads supported: %u", system.dwNumberOfProcessors));
+    WriteLogText(FormatText("Number of concurrent threads supported: %u", system.dwNumberOfProcessors));
   }
   DumpDisplay();
   MEMORYSTATUSEX memory{sizeof memory};
   GlobalMemoryStatusEx(&memory);
-  WriteLogText(Format("Physical memory: %s. Page file: %s",
+  WriteLogText(FormatText("Physical memory: %s. Page file: %s",
                       FormatByteSize(static_cast<double>(memory.ullTotalPhys)).c_str(),
                       FormatByteSize(static_cast<double>(memory.ullTotalPageFile)).c_str()));
   DumpDisks();
   DumpDateTimeInfo();
-  WriteLogText(Format("%u-bit build. %s version. %s", 64u, "Release", __DATE__));
-  WriteLogText(Format("Command line: %s", NarrowText(GetCommandLineW()).c_str()));
-  WriteLogText(Format("Process id: %u", static_cast<unsigned>(GetCurrentProcessId())));
+  WriteLogText(FormatText("%u-bit build. %s version. %s", 64u, "Release", __DATE__));
+  WriteLogText(FormatText("Command line: %s", NarrowText(GetCommandLineW()).c_str()));
+  WriteLogText(FormatText("Process id: %u", static_cast<unsigned>(GetCurrentProcessId())));
   const std::wstring app = GetAppNameW();
-  WriteLogText(Format("Languages root directory: %s", NarrowText(GetLanguagesRootDirW(app.c_str())).c_str()));
-  WriteLogText(Format("Help root directory: %s", NarrowText(GetAppPathW() + L"Help\\").c_str()));
-}
-
-void DumpLocaleInfo() {
-  wchar_t name[LOCALE_NAME_MAX_LENGTH] = {}, point[8] = {};
-  GetLocaleInfoW(LOCALE_USER_DEFAULT, LOCALE_SNAME, name, LOCALE_NAME_MAX_LENGTH);
-  GetLocaleInfoW(LOCALE_USER_DEFAULT, LOCALE_SDECIMAL, point, 8);
-  std::string decimal = NarrowText(point);
-  WriteLogText(Format("Locale name is '%s'. Decimal point: '%c'", NarrowText(name).c_str(),
-                      decimal.empty() ? '.' : decimal[0]));
-}
-
-void DumpProcessMemoryInfo() {
-  PROCESS_MEMORY_COUNTERS counters{};
-  counters.cb = sizeof counters;
-  if (!K32GetProcessMemoryInfo(GetCurrentProcess(), &counters, sizeof counters)) return;
-  WriteLogText(Format("Process memory usage. Working set: %s. Page file usage: %s",
-                      FormatByteSize(static_cast<double>(counters.WorkingSetSize)).c_str(),
-                      FormatByteSize(static_cast<double>(counters.PagefileUsage)).c_str()));
+  WriteLogText(FormatText("Languages root directory: %s", NarrowText(GetLanguagesRootDirW(app.c_str())).c_str()));
+  WriteLogText(FormatText("Help root directory: %s", NarrowText(GetAppPathW() + L"Help\\").c_str()));
 }
 
 }  // namespace kld::ft

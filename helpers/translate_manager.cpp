@@ -3,6 +3,7 @@
 #include <shlwapi.h>
 
 #include "base/boundary.h"
+#include "base/win_handles.h"
 #include "helpers/app_helpers.h"
 #include "helpers/path_parts.h"
 
@@ -21,20 +22,6 @@ std::unique_ptr<CTranslateFileManager> manager;
 // so one slow or dead path holds up nobody else.
 SRWLOCK managerLock = SRWLOCK_INIT;
 
-class ExclusiveLock {
- public:
-  explicit ExclusiveLock(SRWLOCK* lock) : lock_(lock) {
-    if (lock_) AcquireSRWLockExclusive(lock_);
-  }
-  ~ExclusiveLock() {
-    if (lock_) ReleaseSRWLockExclusive(lock_);
-  }
-  ExclusiveLock(const ExclusiveLock&) = delete;
-  ExclusiveLock& operator=(const ExclusiveLock&) = delete;
-
- private:
-  SRWLOCK* lock_;
-};
 
 std::wstring CutAtMarker(const std::wstring& text) {
   size_t marker = text.find(L"#$");
@@ -79,7 +66,7 @@ std::shared_ptr<CTranslateFile> GetTranslateFile(CTranslateFileManager& files, H
   CTranslateFileKey key{sourceLanguage, targetLanguage, name ? name : ModuleTitle(module)};
   std::wstring path;
   {
-    ExclusiveLock lock(mapsLock);
+    win::ExclusiveLock lock(mapsLock);
     auto known = files.knownPaths.find(key);
     if (known != files.knownPaths.end()) path = known->second;
   }
@@ -87,18 +74,18 @@ std::shared_ptr<CTranslateFile> GetTranslateFile(CTranslateFileManager& files, H
     if (sourceLanguage == targetLanguage) return nullptr;
     path = FindTranslateFilePath(key);
     if (path.empty()) return nullptr;
-    ExclusiveLock lock(mapsLock);
+    win::ExclusiveLock lock(mapsLock);
     // A thread that found a path first has fixed it for the name.
     path = files.knownPaths.emplace(key, path).first->second;
   }
   {
-    ExclusiveLock lock(mapsLock);
+    win::ExclusiveLock lock(mapsLock);
     auto loaded = files.loadedFiles.find(path);
     if (loaded != files.loadedFiles.end()) return loaded->second;
   }
   auto file = std::make_shared<CTranslateFile>();
   if (FAILED(file->Load(path.c_str()))) return nullptr;
-  ExclusiveLock lock(mapsLock);
+  win::ExclusiveLock lock(mapsLock);
   // Two threads may have loaded it at once: the first one stored is the one kept.
   return files.loadedFiles.emplace(path, file).first->second;
 }
@@ -115,7 +102,7 @@ std::wstring TranslateText(const std::wstring& text, LANGID sourceLanguage, LANG
   // Out of memory, the text stays as it came.
   return boundary::CallOr(text, [&] {
     {
-      ExclusiveLock lock(&managerLock);
+      win::ExclusiveLock lock(&managerLock);
       if (!managerCreated) {
         manager = std::make_unique<CTranslateFileManager>();
         managerCreated = true;

@@ -2,6 +2,8 @@
 #pragma once
 #include <windows.h>
 
+#include <atomic>
+
 #include "server/server_module.h"
 
 // The application base: keeps the instance that resources are loaded from.
@@ -21,9 +23,14 @@ class CModuleApp : public CAppBase {
   BOOL InitInstance() override;
   int ExitInstance() override;
   CServerModule& Server() noexcept { return server_; }
+  // Every export a host calls runs this first: with the log on, the first one writes its
+  // header and starts listening at the module's edge, off the loader lock.
+  void OnHostCall() noexcept;
 
  private:
   CServerModule server_;
+  bool logging_ = false;
+  std::atomic<bool> logHeaderWritten_{false};
 };
 
 CModuleApp& TheModuleApp() noexcept;

@@ -5,6 +5,7 @@
 #include "base/boundary.h"
 #include "base/class_ids.h"
 #include "base/win_handles.h"
+#include "helpers/filelog.h"
 #include "server/class_factory.h"
 #include "server/registrar.h"
 #include "server/type_library.h"
@@ -55,27 +56,36 @@ HRESULT CServerModule::UnregisterServer() const noexcept {
 HRESULT CServerModule::Register() const {
   if (!module_) return E_UNEXPECTED;
   // The classes register no component categories, so each entry is its script alone.
-  for (const auto& entry : map_)
-    if (HRESULT hr = RunRegistryResource(module_, entry.script, true); FAILED(hr)) return hr;
+  for (const auto& entry : map_) {
+    const HRESULT hr = RunRegistryResource(module_, entry.script, true);
+    kld::ft::LogTextA("Registration: script %u answered 0x%08lX", entry.script, hr);
+    if (FAILED(hr)) return hr;
+  }
   HRESULT hr = RegisterModuleTypeLib(module_);
+  kld::ft::LogTextA("Registration: the type library answered 0x%08lX", hr);
   if (FAILED(hr)) return hr;
 
   win::UniqueHKey key;
-  if (RegCreateKeyExW(HKEY_CLASSES_ROOT, ShellFolderKeyText().c_str(), 0, nullptr, 0, KEY_WRITE, nullptr, key.Put(),
-                      nullptr) == ERROR_SUCCESS)
-    RegSetValueExW(key.Get(), L"Attributes", 0, REG_BINARY, kFolderAttributes, sizeof(kFolderAttributes));
+  LSTATUS status = RegCreateKeyExW(HKEY_CLASSES_ROOT, ShellFolderKeyText().c_str(), 0, nullptr, 0, KEY_WRITE, nullptr,
+                                   key.Put(), nullptr);
+  if (status == ERROR_SUCCESS)
+    status = RegSetValueExW(key.Get(), L"Attributes", 0, REG_BINARY, kFolderAttributes, sizeof(kFolderAttributes));
+  kld::ft::LogTextA("Registration: the folder's attributes answered %ld", status);
   return hr;
 }
 
 void CServerModule::Unregister() const {
   if (module_) {
     bool failed = false;
-    for (const auto& entry : map_)
-      if (FAILED(RunRegistryResource(module_, entry.script, false))) {
+    for (const auto& entry : map_) {
+      const HRESULT hr = RunRegistryResource(module_, entry.script, false);
+      kld::ft::LogTextA("Unregistration: script %u answered 0x%08lX", entry.script, hr);
+      if (FAILED(hr)) {
         failed = true;
         break;
       }
-    if (!failed) UnregisterModuleTypeLib(module_);
+    }
+    if (!failed) kld::ft::LogTextA("Unregistration: the type library answered 0x%08lX", UnregisterModuleTypeLib(module_));
   }
   std::wstring keyText = ShellFolderKeyText();
   // A value name with a path in it names nothing; this first removal never finds

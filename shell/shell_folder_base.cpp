@@ -12,8 +12,22 @@ CGravonShellFolderBase::CGravonShellFolderBase(CGravonPidlManagerBase* pidlMgr) 
   if (FAILED(SHGetMalloc(malloc_.Put()))) malloc_.Reset();
 }
 
+namespace {
+// Answered only by our own folders, never registered: it names the object, not a contract.
+constexpr GUID kOwnFolder = {0xecef8d10, 0x223f, 0x428e, {0x85, 0x2b, 0x06, 0xec, 0xa6, 0xf2, 0xde, 0x9d}};
+}  // namespace
+
+CGravonShellFolderBase* CGravonShellFolderBase::FromFolder(IShellFolder* folder) noexcept {
+  void* own = nullptr;
+  if (!folder || FAILED(folder->QueryInterface(kOwnFolder, &own)) || !own) return nullptr;
+  auto* base = static_cast<CGravonShellFolderBase*>(own);
+  base->Release();  // the caller holds the folder already
+  return base;
+}
+
 void* CGravonShellFolderBase::FindInterface(REFIID riid) noexcept {
   if (void* found = ComObject::FindInterface(riid)) return found;
+  if (riid == kOwnFolder) return this;
   if (riid == IID_IPersist) return static_cast<IPersist*>(static_cast<IPersistFolder*>(this));
   return nullptr;
 }

@@ -14,6 +14,10 @@ class CGravonShellFolderBase : public com::ComObject<IShellFolder, IPersistFolde
   // Takes ownership of the manager (null if it could not be made).
   explicit CGravonShellFolderBase(CGravonPidlManagerBase* pidlMgr);
 
+  // The folder behind an interface, when it is one of ours; null for a folder of anyone
+  // else. Asked through COM, as the module is built without run-time type information.
+  static CGravonShellFolderBase* FromFolder(IShellFolder* folder) noexcept;
+
   // The folder's address. Plain: the parent's address, a backslash and this folder's
   // text, so it starts with a backslash. Parsing: at the root the root's parsing
   // name, below it that and the level's text. False if it doesn't fit `size`.

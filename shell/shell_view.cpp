@@ -18,7 +18,7 @@ constexpr DWORD kEnumThreadStack = 0x100000;
 
 // Off the window's thread: asks the folder for its items and posts them to the view.
 // Touches nothing but its job, and keeps the module mapped until it has left it.
-DWORD WINAPI EnumThreadProc(void* parameter) {
+DWORD WINAPI EnumThreadProc(void* parameter) noexcept {
   auto* job = static_cast<EnumJob*>(parameter);
   SetThreadLocale(job->Locale);
   IEnumIDList* list = nullptr;
@@ -57,7 +57,7 @@ CMarlixDLShellView::CMarlixDLShellView() {
 HRESULT CMarlixDLShellView::Init(IShellFolder* folder, LPCITEMIDLIST folderIdList) {
   if (!IsUsable()) return E_OUTOFMEMORY;
   ShellFolder = com::ComPtr<IShellFolder>(folder);
-  FolderBase = dynamic_cast<CGravonShellFolderBase*>(folder);
+  FolderBase = CGravonShellFolderBase::FromFolder(folder);
   if (!PidlMgr->Assign(FolderIdList, folderIdList)) return E_OUTOFMEMORY;
   UIState = 0;
   ThreadLocale = GetThreadLocale();

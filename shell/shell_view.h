@@ -70,7 +70,7 @@ class CShellViewListWindow {
 
  private:
   static LRESULT CALLBACK Procedure(HWND window, UINT message, WPARAM wParam, LPARAM lParam, UINT_PTR id,
-                                    DWORD_PTR self);
+                                    DWORD_PTR self) noexcept;
   static LRESULT Handle(HWND window, UINT message, WPARAM wParam, LPARAM lParam, DWORD_PTR self);
   HWND window_ = nullptr;
 };
@@ -130,7 +130,7 @@ class CMarlixDLShellView
   void RefreshAll();
 
  private:
-  friend LRESULT CALLBACK ViewWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
+  friend LRESULT CALLBACK ViewWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) noexcept;
 
   // The list (shell_view_list.cpp)
   // Whether the folder's list has a last id, and that id's type (0 without one).

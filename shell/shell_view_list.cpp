@@ -18,18 +18,18 @@ constexpr DWORD kListBaseStyle = WS_CHILD | WS_VISIBLE | WS_TABSTOP | LVS_SHOWSE
 static_assert(kListBaseStyle == 0x50010148);
 
 // The folder rides in as the sort's parameter; the row with no list compares equal to all.
-int CALLBACK CompareRows(LPARAM first, LPARAM second, LPARAM folder, LPARAM parameter) {
+int CALLBACK CompareRows(LPARAM first, LPARAM second, LPARAM folder, LPARAM parameter) noexcept {
   if (!folder) return 0;
   // The folder answers the order itself as the result, not as a code.
   return static_cast<int>(reinterpret_cast<IShellFolder*>(folder)->CompareIDs(
       parameter, reinterpret_cast<LPCITEMIDLIST>(first), reinterpret_cast<LPCITEMIDLIST>(second)));
 }
 
-int CALLBACK CompareDefault(LPARAM first, LPARAM second, LPARAM folder) {
+int CALLBACK CompareDefault(LPARAM first, LPARAM second, LPARAM folder) noexcept {
   return CompareRows(first, second, folder, 0);
 }
 
-int CALLBACK CompareBySortColumn(LPARAM first, LPARAM second, LPARAM folder) {
+int CALLBACK CompareBySortColumn(LPARAM first, LPARAM second, LPARAM folder) noexcept {
   return CompareRows(first, second, folder, static_cast<LPARAM>(SortColumn * SortDirection));
 }
 

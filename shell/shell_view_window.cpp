@@ -12,7 +12,7 @@
 #include "shell/shell_uuids.h"
 #include "transfer/drop_target.h"
 
-LRESULT CALLBACK ViewWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+LRESULT CALLBACK ViewWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) noexcept {
   if (message == WM_NCCREATE) {
     auto* create = reinterpret_cast<CREATESTRUCTW*>(lParam);
     auto* view = static_cast<CMarlixDLShellView*>(static_cast<IShellView*>(create->lpCreateParams));
@@ -319,7 +319,7 @@ void CShellViewListWindow::Detach() {
 }
 
 LRESULT CALLBACK CShellViewListWindow::Procedure(HWND window, UINT message, WPARAM wParam, LPARAM lParam, UINT_PTR,
-                                                 DWORD_PTR self) {
+                                                 DWORD_PTR self) noexcept {
   return boundary::CallWindow(window, message, wParam, lParam, [&] { return Handle(window, message, wParam, lParam, self); });
 }
 

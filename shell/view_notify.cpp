@@ -9,7 +9,7 @@ void BroadcastChange(UINT lastIdType) {
 
 namespace {
 
-LRESULT CALLBACK NotifyWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+LRESULT CALLBACK NotifyWindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) noexcept {
   return boundary::CallWindow(window, message, wParam, lParam, [&]() -> LRESULT {
     if (message == GlobalNotifyMessage) {
       auto* pair = reinterpret_cast<NotifyWindowPair*>(GetWindowLongPtrW(window, GWLP_USERDATA));

@@ -142,6 +142,13 @@ std::wstring GetBaseKeyName() { return L"Software\\Gravon\\Shell Extensions\\Mar
 
 std::wstring GetLevelsKeyName() { return GetBaseKeyName() + L"\\Levels"; }
 
+bool DiagnosticLogWanted() {
+  DWORD value = 0, size = sizeof(value);
+  return RegGetValueW(HKEY_CURRENT_USER, GetBaseKeyName().c_str(), L"Diagnostic Log", RRF_RT_REG_DWORD, nullptr,
+                      &value, &size) == ERROR_SUCCESS &&
+         value == 1;
+}
+
 bool LoadDisplaySettings() {
   ColumnWidths[0] = ColumnWidths[1] = 100;
   win::UniqueHKey base;

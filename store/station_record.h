@@ -38,6 +38,10 @@ extern int ColumnWidths[2];
 std::wstring GetBaseKeyName();
 std::wstring GetLevelsKeyName();
 
+// The support switch of the diagnostic log: a DWORD "Diagnostic Log" of 1 under the base key.
+// Off when missing or anything else.
+bool DiagnosticLogWanted();
+
 // True if the stored "Display Settings" were read; the widths are 100 otherwise.
 bool LoadDisplaySettings();
 bool SaveDisplaySettings();

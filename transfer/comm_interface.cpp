@@ -2,11 +2,12 @@
 
 #include <cstdlib>
 
-#include "helpers/error_reporter.h"
-#include "helpers/file_helpers.h"
 #include "base/module_instance.h"
 #include "base/resource_ids.h"
 #include "base/window_messages.h"
+#include "helpers/error_reporter.h"
+#include "helpers/file_helpers.h"
+#include "helpers/filelog.h"
 #include "store/string_table.h"
 
 HWND DownloadDialogWindow = nullptr;
@@ -49,6 +50,7 @@ HRESULT LastErrorToFailureCode(DWORD value) {
 
 IMarlixComm* CreateCommObject(std::wstring& errorText) {
   std::wstring path = CommLibraryPath();
+  kld::ft::LogTextA("Download: loading the instrument library '%ls'", path.c_str());
   // Never freed: the object may run threads of the library until the process ends.
   HMODULE library = LoadLibraryW(path.c_str());
   if (!library) {

@@ -6,6 +6,7 @@
 
 #include "base/boundary.h"
 #include "base/win_handles.h"
+#include "helpers/filelog.h"
 #include "store/pidl_manager.h"
 #include "store/station_record.h"
 #include "transfer/download_dialog.h"
@@ -114,23 +115,35 @@ HRESULT CMarlixDLDataObject::GetFileContents(LONG index, STGMEDIUM& medium) {
   pidl.GetPath(item, path, 260);
   CStationRecord level;
   level.Name = PathComponent(path, 1);
-  if (HRESULT hr = FindStation(level); hr != 0) return hr;
+  kld::ft::LogTextA("Download: the receiver asks for the file of level '%ls'", level.Name.c_str());
+  if (HRESULT hr = FindStation(level); hr != 0) {
+    kld::ft::LogTextA("Download: the level is not in the store (0x%08lX)", hr);
+    return hr;
+  }
+  kld::ft::LogTextA("Download: settings COM%d, %d baud, parity %d, %d data bits, stop bits %d, flow %d, "
+                    "checksum %d, model '%ls'", level.Port, level.BaudRate, level.Parity, level.DataBits,
+                    level.StopBits, level.Flow, level.CheckSum, level.Model.c_str());
 
   std::wstring target;
   // The bare system code goes back as it is, not converted.
-  if (DWORD error = MakeDownloadTargetPath(target); error != 0) return static_cast<HRESULT>(error);
+  if (DWORD error = MakeDownloadTargetPath(target); error != 0) {
+    kld::ft::LogTextA("Download: no temporary file name (system error %lu)", error);
+    return static_cast<HRESULT>(error);
+  }
 
   INT_PTR result;
   {
     auto dialog = std::make_unique<CDownloadProgressDialog>(nullptr, level, target);
     result = dialog->DoModal();
   }
+  kld::ft::LogTextA("Download: the dialog ended with %d", static_cast<int>(result));
   if (result == IDCANCEL) return S_FALSE;
 
   target += L".txt";
   auto stream = com::Make<CStream2>();
   if (!stream) return E_OUTOFMEMORY;
   stream->AttachFile(target, kFileText, true);
+  kld::ft::LogTextA("Download: the receiver gets '%ls' as %ls", target.c_str(), kFileText);
   medium.tymed = TYMED_ISTREAM;
   medium.pstm = stream.Detach();
   medium.pUnkForRelease = nullptr;

@@ -1,9 +1,10 @@
 #include "transfer/download_dialog.h"
 
-#include "helpers/error_reporter.h"
-#include "helpers/file_helpers.h"
 #include "base/resource_ids.h"
 #include "base/window_messages.h"
+#include "helpers/error_reporter.h"
+#include "helpers/file_helpers.h"
+#include "helpers/filelog.h"
 #include "store/string_table.h"
 
 namespace {
@@ -70,6 +71,7 @@ void CDownloadProgressDialog::SetStatus(UINT stringId) {
 }
 
 void CDownloadProgressDialog::FailureExit(const std::wstring& text) {
+  kld::ft::LogTextA("Download: failed, the user reads \"%ls\"", text.c_str());
   MessageBoxW(Handle(), text.c_str(), LoadTranslatedString(IDS_ROOT_NAME).c_str(), kWarningBox);
   EndDialog(IDCANCEL);
 }
@@ -86,6 +88,7 @@ bool CDownloadProgressDialog::StartTransfer() {
     FailureExit(error);
     return false;
   }
+  kld::ft::LogTextA("Download: the instrument library is loaded");
   Comm->Initialize();
   Comm->SetCallback(&CommResultCallback);
   // The library may call back after the dialog, and every object of ours, is gone: the
@@ -98,11 +101,16 @@ bool CDownloadProgressDialog::StartTransfer() {
   WideCharToMultiByte(CP_THREAD_ACP, 0, TargetPath.c_str(), -1, narrowPath, MAX_PATH, nullptr,
                       nullptr);
   narrowPath[MAX_PATH - 1] = '\0';
-  if (Comm->SetFilePath(narrowPath) != 0) {
+  // Each answer of the library goes to the log before it is judged.
+  const auto answered = [](const char* step, int answer) {
+    kld::ft::LogTextA("Download: %s answered %d", step, answer);
+    return answer;
+  };
+  if (answered("SetFilePath", Comm->SetFilePath(narrowPath)) != 0) {
     FailureExit(LoadTranslatedString(IDS_ERR_SET_FILE_PATH));
     return false;
   }
-  if (Comm->SetTimeout(kTimeout) != 0) {
+  if (answered("SetTimeout", Comm->SetTimeout(kTimeout)) != 0) {
     FailureExit(LoadTranslatedString(IDS_ERR_SET_TIMEOUT));
     return false;
   }
@@ -112,17 +120,17 @@ bool CDownloadProgressDialog::StartTransfer() {
     FailureExit(kld::ft::BuildErrorText(E_OUTOFMEMORY, nullptr, nullptr, nullptr));
     return false;
   }
-  if (Comm->SetPoints(Points) != 0) {
+  if (answered("SetPoints", Comm->SetPoints(Points)) != 0) {
     FailureExit(LoadTranslatedString(IDS_ERR_SET_POINTS));
     return false;
   }
   // The library takes parity before stop bits and flow before data bits.
-  if (Comm->SetCommParameters(Level.Port, Level.BaudRate, Level.Parity, Level.StopBits, Level.Flow,
-                              Level.DataBits, Level.CheckSum) != 0) {
+  if (answered("SetCommParameters", Comm->SetCommParameters(Level.Port, Level.BaudRate, Level.Parity, Level.StopBits,
+                                                            Level.Flow, Level.DataBits, Level.CheckSum)) != 0) {
     FailureExit(LoadTranslatedString(IDS_ERR_SET_COMM_PARAMS));
     return false;
   }
-  int received = Comm->ReceiveFile(kReceiveWait, true);
+  int received = answered("ReceiveFile", Comm->ReceiveFile(kReceiveWait, true));
   if (received != 0) {
     FailureExit(CommResultText(received));
     return false;
@@ -131,6 +139,7 @@ bool CDownloadProgressDialog::StartTransfer() {
 }
 
 void CDownloadProgressDialog::OnStart() {
+  kld::ft::LogTextA("Download: Start pressed");
   if (!StartTransfer()) return;
   SetStatus(IDS_WAITING_FOR_DOWNLOAD);
   EnableWindow(Item(IDC_TRANSFER_START), FALSE);
@@ -138,6 +147,7 @@ void CDownloadProgressDialog::OnStart() {
 
 LRESULT CDownloadProgressDialog::OnDownloadMessage(WPARAM, LPARAM lParam) {
   int code = static_cast<int>(lParam);
+  kld::ft::LogTextA("Download: the instrument's transfer ended with %d", code);
   if (code != 0) {
     FailureExit(CommResultText(code));
     return 0;
@@ -153,6 +163,7 @@ void CDownloadProgressDialog::OnCancel() {
     return;
   }
   SetStatus(IDS_TERMINATING);
+  kld::ft::LogTextA("Download: cancelled by the user, the connection is ended");
   Comm->TerminateConnection();
 }
 

@@ -53,10 +53,23 @@ query "$folder_key\\InprocServer32" /ve | grep -qF 'C:\Program Files\Marlix Digi
 windows() { printf 'Z:%s' "${1//\//\\}"; }
 rm -rf "$road_dir"
 mkdir -p "$road_dir/received" "$road_dir/screens"
+# The road runs with the diagnostic log switched on as README tells a support person to.
+view_key='HKCU\Software\Gravon\Shell Extensions\Marlix DL View'
+run reg add "$view_key" /v "Diagnostic Log" /t REG_DWORD /d 1 /f >/dev/null || fail "cannot switch the log on"
 start=$(date +%s)
 run "$road" "$(windows "$peer")" "$(windows "$road_dir/received")" "$(windows "$road_dir/screens")" ||
   fail "the download road"
 echo "the download road took $(( $(date +%s) - start )) s"
+run reg delete "$view_key" /v "Diagnostic Log" /f >/dev/null
+# The road's own process writes the download; each new process deletes older logs it can.
+road_log=$(find "$WINEPREFIX/drive_c/users" -name 'MarlixDLShellExt_*.log' -exec grep -l "Download: Start pressed" {} + | head -1)
+if [ -z "$road_log" ]; then
+  fail "no diagnostic log tells of the download"
+else
+  cp "$road_log" "$road_dir/download.log"
+  grep -q "ReceiveFile answered 0" "$road_log" || fail "the log has no answer of the instrument to ReceiveFile"
+  grep -q "transfer ended with 0" "$road_log" || fail "the log has no end of the transfer"
+fi
 for shot in "$road_dir"/screens/*.bmp; do /usr/bin/convert "$shot" "${shot%.bmp}.png" && rm "$shot"; done
 
 uninstall

@@ -71,13 +71,15 @@ void CDialogWindow::DdxText(bool toControls, int id, std::wstring& value) {
   else value = WindowText(control);
 }
 
-void CDialogWindow::DdxComboExact(bool toControls, int id, std::wstring& value) {
+HWND CDialogWindow::ComboToFill(bool toControls, int id, std::wstring& value) {
   HWND combo = Item(id);
+  if (combo && !toControls) value = ComboText(combo);
+  return toControls ? combo : nullptr;
+}
+
+void CDialogWindow::DdxComboExact(bool toControls, int id, std::wstring& value) {
+  HWND combo = ComboToFill(toControls, id, value);
   if (!combo) return;
-  if (!toControls) {
-    value = ComboText(combo);
-    return;
-  }
   // CB_FINDSTRINGEXACT ignores case: walk its matches until one equals the text.
   LRESULT first = SendMessageW(combo, CB_FINDSTRINGEXACT, static_cast<WPARAM>(-1), reinterpret_cast<LPARAM>(value.c_str()));
   for (LRESULT found = first; found != CB_ERR;) {
@@ -92,12 +94,8 @@ void CDialogWindow::DdxComboExact(bool toControls, int id, std::wstring& value) 
 }
 
 void CDialogWindow::DdxComboPrefix(bool toControls, int id, std::wstring& value) {
-  HWND combo = Item(id);
+  HWND combo = ComboToFill(toControls, id, value);
   if (!combo) return;
-  if (!toControls) {
-    value = ComboText(combo);
-    return;
-  }
   LRESULT found = SendMessageW(combo, CB_SELECTSTRING, static_cast<WPARAM>(-1), reinterpret_cast<LPARAM>(value.c_str()));
   if (found == CB_ERR) KeepUnmatchedText(combo, value);
 }

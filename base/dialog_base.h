@@ -43,6 +43,8 @@ class CDialogWindow {
   void DdxComboExact(bool toControls, int id, std::wstring& value);
   // Combo box by text: selects the first item that begins with it (the control's own search).
   void DdxComboPrefix(bool toControls, int id, std::wstring& value);
+  // Reads the combo box into `value` and gives null, or gives the box to fill from `value`.
+  HWND ComboToFill(bool toControls, int id, std::wstring& value);
 
   HWND Item(int id) const noexcept { return GetDlgItem(window_, id); }
 

@@ -1,4 +1,4 @@
-// A person dragging files from another program onto a level of the root view sees the level light up and the drop refused.
+// A person dragging files from another program onto a level of the root view sees it light up and the drop refused.
 #include <windows.h>
 #include <commctrl.h>
 #include <shlobj.h>
@@ -110,7 +110,10 @@ class DropOnRootView : public testing::Test {
       Mouse(0, {600, 90});
       Sleep(200);
       Mouse(MOUSEEVENTF_LEFTDOWN, {600, 90});
-      for (int step = 1; step <= 10; ++step, Sleep(60)) Mouse(0, {600 + (to.x - 600) * step / 10, 90 + (to.y - 90) * step / 10});
+      for (int step = 1; step <= 10; ++step) {
+        Sleep(60);
+        Mouse(0, {600 + (to.x - 600) * step / 10, 90 + (to.y - 90) * step / 10});
+      }
       resting = true;
       ui::WaitFor([&] { return release.load(); });
       Mouse(MOUSEEVENTF_LEFTUP, to);

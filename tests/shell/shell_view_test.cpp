@@ -1,4 +1,4 @@
-// The folder view where no real host shows it: menus, status bar, view state, commands, its lifetime, and across processes.
+// The folder view where no real host shows it: menus, status bar, view state, commands, lifetime, other processes.
 #include <windows.h>
 #include <commctrl.h>
 #include <shlobj.h>
@@ -434,7 +434,8 @@ struct Peer {
     wchar_t exe[MAX_PATH] = {};
     GetModuleFileNameW(nullptr, exe, MAX_PATH);
     SetEnvironmentVariableW(L"MARLIX_VIEW_PEER_STORE", store.c_str());
-    std::wstring command = L"\"" + std::wstring(exe) + L"\" --gtest_also_run_disabled_tests --gtest_filter=View.DISABLED_Peer";
+    std::wstring command = L"\"" + std::wstring(exe) + L"\" --gtest_also_run_disabled_tests";
+    command += L" --gtest_filter=View.DISABLED_Peer";
     STARTUPINFOW startup{sizeof(startup)};
     PROCESS_INFORMATION info{};
     if (CreateProcessW(nullptr, command.data(), nullptr, nullptr, FALSE, 0, nullptr, nullptr, &startup, &info))
@@ -450,7 +451,8 @@ struct Peer {
     if (!process) return;
     PostMessageW(root, WM_COMMAND, IDCLOSE, 0);
     DWORD code = 99;
-    if (!PumpUntil([&] { return WaitForSingleObject(process, 0) == WAIT_OBJECT_0; }, 20000)) TerminateProcess(process, 99);
+    const bool ended = PumpUntil([&] { return WaitForSingleObject(process, 0) == WAIT_OBJECT_0; }, 20000);
+    if (!ended) TerminateProcess(process, 99);
     WaitForSingleObject(process, 5000);
     GetExitCodeProcess(process, &code);
     EXPECT_EQ(code, 0u) << "the peer's own checks";

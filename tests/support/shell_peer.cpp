@@ -1,4 +1,4 @@
-// Another program as a person uses it beside Explorer: a folder window that takes dropped or pasted files, or a drag source.
+// Another program a person uses beside Explorer: a folder window taking dropped or pasted files, or a drag source.
 //   shell_peer drop <folder> <x> <y> <seconds>   a window at (x, y), 200x150, that takes one drop
 //   shell_peer paste <folder>                     what the clipboard holds, at once
 // As a receiver it reads "FileGroupDescriptorW", then "FileContents" for each index, writes each

@@ -1,6 +1,4 @@
-// Drops on the root view as Wine's ExplorerBrowser hosts it: a second process drags real
-// files, or the virtual file of a level, over a level row with real mouse input, and the
-// drop is refused; the same target called directly for what a mouse can't make.
+// A person dragging files from another program onto a level of the root view sees it light up and the drop refused.
 #include <windows.h>
 #include <commctrl.h>
 #include <shlobj.h>
@@ -101,13 +99,14 @@ class DropOnRootView : public testing::Test {
     return rows;
   }
   // The peer drags `items` from its window onto `row` as a hand would; answers the peer's
-  // report and, in `seen`, the selection while the pointer rested on the row.
+  // report and, in `seen`, the selection once the pointer rests on the row.
   std::string DragOnto(int row, const std::wstring& items, std::vector<int>& seen) {
     Peer peer(L"drag 500 20 30 " + items);
     if (!PumpUntil([&] { return peer.Output().find("ready") != std::string::npos; }, 20000)) return "peer not ready";
-    std::atomic<int> stage{0};
+    std::atomic<bool> resting{false}, release{false};
     POINT to = RowPoint(row);
     std::thread hand([&] {
+      // A hand's pace: the drag starts only after a pause and a move of some steps.
       Mouse(0, {600, 90});
       Sleep(200);
       Mouse(MOUSEEVENTF_LEFTDOWN, {600, 90});
@@ -115,15 +114,13 @@ class DropOnRootView : public testing::Test {
         Sleep(60);
         Mouse(0, {600 + (to.x - 600) * step / 10, 90 + (to.y - 90) * step / 10});
       }
-      Sleep(300);
-      stage = 1;  // resting on the row
-      while (stage == 1) Sleep(10);
+      resting = true;
+      ui::WaitFor([&] { return release.load(); });
       Mouse(MOUSEEVENTF_LEFTUP, to);
     });
-    PumpUntil([&] { return stage == 1; }, 20000);
-    PumpUntil([] { return false; }, 200);
+    PumpUntil([&] { return resting && Selected() == std::vector<int>{row}; }, 5000);
     seen = Selected();
-    stage = 2;
+    release = true;
     PumpUntil([&] { return WaitForSingleObject(peer.process, 0) == WAIT_OBJECT_0; }, 20000);
     hand.join();
     return peer.Output();
@@ -136,33 +133,27 @@ class DropOnRootView : public testing::Test {
   std::vector<std::wstring> before_;
 };
 
-// Copy is offered while the files are over a level row, which alone is selected; the drop
-// itself is refused with E_INVALIDARG and nothing happens.
+// Copy is offered while real files, or the virtual file of a level, are over a level row,
+// which alone is selected; the drop itself is refused with E_INVALIDARG and nothing happens.
 TEST_F(DropOnRootView, FilesFromAnotherProcessLightUpALevelAndAreRefused) {
   wchar_t temp[MAX_PATH];
   GetTempPathW(MAX_PATH, temp);
   const std::wstring file = std::wstring(temp) + L"survey.txt";
   std::ofstream(std::filesystem::path(file)) << "points";
-  ListView_SetItemState(list_, 0, LVIS_SELECTED, LVIS_SELECTED);
-  ListView_SetItemState(list_, 2, LVIS_SELECTED, LVIS_SELECTED);
-  std::vector<int> seen;
-  std::string report = DragOnto(1, L"\"" + file + L"\"", seen);
-  EXPECT_EQ(seen, std::vector<int>{1}) << "the row under the pointer alone";
-  EXPECT_TRUE(SawCopy(report)) << report;
-  // DragEnter and the refused drop write no effect, so the source keeps what it allowed.
-  EXPECT_NE(report.find("result 0x80070057 7"), std::string::npos) << report;
-  EXPECT_EQ(Selected(), std::vector<int>{1}) << "the refused row stays selected";
+  const std::pair<int, std::wstring> drags[] = {{1, L"\"" + file + L"\""},
+                                                {2, std::wstring(kFolderPath) + L"\\Alpha\\file1.tkf"}};
+  for (const auto& [row, items] : drags) {
+    ListView_SetItemState(list_, 0, LVIS_SELECTED, LVIS_SELECTED);
+    ListView_SetItemState(list_, 3 - row, LVIS_SELECTED, LVIS_SELECTED);
+    std::vector<int> seen;
+    std::string report = DragOnto(row, items, seen);
+    EXPECT_EQ(seen, std::vector<int>{row}) << "the row under the pointer alone";
+    EXPECT_TRUE(SawCopy(report)) << report;
+    // DragEnter and the refused drop write no effect, so the source keeps what it allowed.
+    EXPECT_NE(report.find("result 0x80070057 7"), std::string::npos) << report;
+    EXPECT_EQ(Selected(), std::vector<int>{row}) << "the refused row stays selected";
+  }
   DeleteFileW(file.c_str());
-}
-
-// The virtual file offers both halves, so it is taken while it moves, and refused at the
-// drop: the instrument is never asked.
-TEST_F(DropOnRootView, TheVirtualFileOfALevelIsRefusedWithoutATransfer) {
-  std::vector<int> seen;
-  std::string report = DragOnto(2, std::wstring(kFolderPath) + L"\\Alpha\\file1.tkf", seen);
-  EXPECT_EQ(seen, std::vector<int>{2});
-  EXPECT_TRUE(SawCopy(report)) << report;
-  EXPECT_NE(report.find("result 0x80070057 7"), std::string::npos) << report;
 }
 
 // What a mouse can't make: a drop on the add row or on empty space, no effect pointer,

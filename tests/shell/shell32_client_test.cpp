@@ -1,4 +1,4 @@
-// Drives the registered module through Wine's own shell32, as Explorer would.
+// The registered folder as Wine's own shell32, ExplorerBrowser and Open dialog show it to a person, keys and all.
 #include "shell/shell_test_util.h"
 
 #include <gtest/gtest.h>
@@ -62,18 +62,25 @@ std::vector<std::wstring> Rows(HWND list) {
   return rows;
 }
 
-// A person presses Delete with the focus in `window`, and the host goes on until `done`.
-// `view`, if given, is the host's current view, to which its loop hands every key first as
-// Explorer's window does; otherwise the host is another thread.
-bool TypeDelete(HWND window, const std::function<bool()>& done, IShellView* view = nullptr) {
+// A person presses `key`, with Ctrl if told, with the focus in `window`, and the host goes on
+// until `done`. `view`, if given, is the host's current view, to which its loop hands every key
+// first as Explorer's window does; otherwise the host is another thread.
+bool Type(HWND window, WORD key, const std::function<bool()>& done, IShellView* view = nullptr, bool ctrl = false) {
   HWND top = GetAncestor(window, GA_ROOT);
   SetForegroundWindow(top);
   SendMessageW(top, WM_NEXTDLGCTL, reinterpret_cast<WPARAM>(window), TRUE);
   if (view) SetFocus(window);
-  INPUT keys[2] = {{INPUT_KEYBOARD}, {INPUT_KEYBOARD}};
-  keys[0].ki.wVk = keys[1].ki.wVk = VK_DELETE;
-  keys[1].ki.dwFlags = KEYEVENTF_KEYUP;
-  SendInput(2, keys, sizeof(INPUT));
+  std::vector<INPUT> keys;
+  const auto press = [&](WORD vk, DWORD flags) {
+    keys.push_back({INPUT_KEYBOARD});
+    keys.back().ki.wVk = vk;
+    keys.back().ki.dwFlags = flags;
+  };
+  if (ctrl) press(VK_CONTROL, 0);
+  press(key, 0);
+  press(key, KEYEVENTF_KEYUP);
+  if (ctrl) press(VK_CONTROL, KEYEVENTF_KEYUP);
+  SendInput(static_cast<UINT>(keys.size()), keys.data(), sizeof(INPUT));
   if (!view) return sheet::WaitFor(done);
   for (DWORD start = GetTickCount(); !done(); MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT)) {
     if (GetTickCount() - start > 10000) return false;
@@ -114,9 +121,15 @@ TEST(ExplorerBrowserClient, ShowsTheLevelsAndMovesIntoALevelWhenItIsActivated) {
   HWND address = CreateWindowExW(0, L"EDIT", L"Levels", WS_CHILD | WS_VISIBLE, 0, 410, 600, 20, frame, nullptr,
                                  nullptr, nullptr);
   ListView_SetItemState(list, 3, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
-  EXPECT_TRUE(TypeDelete(address, [&] { return ui::Text(address) != L"Levels"; }, view.Get()));
+  EXPECT_TRUE(Type(address, VK_DELETE, [&] { return ui::Text(address) != L"Levels"; }, view.Get()));
   EXPECT_EQ(sheet::StoredLevels().size(), 3u) << "a key of the address bar deletes no level";
-  EXPECT_TRUE(TypeDelete(list, [] { return sheet::StoredLevels().size() == 2; }, view.Get())) << "the list's";
+  EXPECT_TRUE(Type(list, VK_DELETE, [] { return sheet::StoredLevels().size() == 2; }, view.Get())) << "the list's";
+  list = CurrentList(browser.Get());
+  ListView_SetItemState(list, 1, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
+  const UINT stations = RegisterClipboardFormatW(L"Marlix Total Stations");
+  EXPECT_TRUE(Type(list, 'C', [&] { return IsClipboardFormatAvailable(stations) != FALSE; }, view.Get(), true));
+  EXPECT_TRUE(Type(list, 'V', [] { return sheet::StoredLevels().size() == 3; }, view.Get(), true)) << "Ctrl+C, Ctrl+V";
+  OleSetClipboard(nullptr);
   list = CurrentList(browser.Get());
   view.Reset(), commands.Reset();
 
@@ -212,9 +225,9 @@ TEST(OpenDialogClient, ListsTheLevelsOpensOneAndTakesItsFileAsTheDefaultCommand)
     ASSERT_TRUE(name);
     if (list) ListView_SetItemState(list, 2, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
     SetWindowTextW(name, L"x");  // after the selection, which the dialog copies into the box
-    EXPECT_TRUE(TypeDelete(name, [&] { return ui::Text(name).empty(); }));
+    EXPECT_TRUE(Type(name, VK_DELETE, [&] { return ui::Text(name).empty(); }));
     EXPECT_EQ(sheet::StoredLevels().size(), 2u) << "a key of the file-name box deletes no level";
-    EXPECT_TRUE(list && TypeDelete(list, [] { return sheet::StoredLevels().size() == 1; })) << "the list's";
+    EXPECT_TRUE(list && Type(list, VK_DELETE, [] { return sheet::StoredLevels().size() == 1; })) << "the list's";
     list = DialogList(run.dialog, 2);
     if (list) ActivateRow(list, 1);
     HWND levelList = DialogList(run.dialog, 1);

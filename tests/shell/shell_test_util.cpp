@@ -1,3 +1,4 @@
+// Reaching the folder as the shell does, and waiting on what a person would see.
 #include "shell/shell_test_util.h"
 
 #include <commctrl.h>

@@ -1,3 +1,4 @@
+// What the shell tests share to reach the folder as the shell does and to wait on what a person would see.
 #pragma once
 #include <windows.h>
 #include <shlobj.h>

@@ -1,15 +1,12 @@
-// A second process that acts as the shell would, for tests across processes.
-// As a receiver of virtual files, as Explorer is one: it takes a drop (or the clipboard),
-// reads "FileGroupDescriptorW", then "FileContents" for each index, and writes each stream
-// into a folder under the descriptor's name.
+// Another program a person uses beside Explorer: a folder window taking dropped or pasted files, or a drag source.
 //   shell_peer drop <folder> <x> <y> <seconds>   a window at (x, y), 200x150, that takes one drop
 //   shell_peer paste <folder>                     what the clipboard holds, at once
-// Prints one line per file ("received <name> <bytes>") or a failure, and exits 0 only if
-// every file was written. Exit 2: nothing was dropped in time.
-// As a drag source, as Explorer is one: the shell's own data object of the items.
+// As a receiver it reads "FileGroupDescriptorW", then "FileContents" for each index, writes each
+// stream into <folder> under its name and prints "received <name> <bytes>" or a failure; it exits
+// 0 only if every file was written, 2 if nothing was dropped in time.
 //   shell_peer drag <x> <y> <seconds> <parsing name>...
-// A window at (x, y), 200x150; a left button press on it starts the drag, which ends as
-// the mouse says. Prints "effects <every effect the target answered, as a bit set>" and
+// The shell's own data object of the items, dragged from a window at (x, y) once the left button
+// is pressed on it. Prints "effects <every effect the target answered, as a bit set>" and
 // "result <DoDragDrop's result> <effect>"; exits 0 if the drag ran.
 #include <windows.h>
 #include <ole2.h>
@@ -76,14 +73,19 @@ int ReceiveAll(IDataObject* data) {
   return failures ? 1 : 0;
 }
 
-struct Target : IDropTarget {
+// Static objects of this program: their counts don't matter.
+template <class Interface>
+struct Static : Interface {
   STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override {
-    if (riid != IID_IUnknown && riid != IID_IDropTarget) return *ppv = nullptr, E_NOINTERFACE;
+    if (riid != IID_IUnknown && riid != __uuidof(Interface)) return *ppv = nullptr, E_NOINTERFACE;
     *ppv = this;
     return S_OK;
   }
   STDMETHODIMP_(ULONG) AddRef() override { return 2; }
   STDMETHODIMP_(ULONG) Release() override { return 1; }
+};
+
+struct Target : Static<IDropTarget> {
   STDMETHODIMP DragEnter(IDataObject*, DWORD, POINTL, DWORD* effect) override {
     *effect &= DROPEFFECT_COPY;
     return S_OK;
@@ -102,14 +104,7 @@ struct Target : IDropTarget {
 };
 
 // Ends the drag when the button goes up, and remembers what the target offered on the way.
-struct Source : IDropSource {
-  STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override {
-    if (riid != IID_IUnknown && riid != IID_IDropSource) return *ppv = nullptr, E_NOINTERFACE;
-    *ppv = this;
-    return S_OK;
-  }
-  STDMETHODIMP_(ULONG) AddRef() override { return 2; }
-  STDMETHODIMP_(ULONG) Release() override { return 1; }
+struct Source : Static<IDropSource> {
   STDMETHODIMP QueryContinueDrag(BOOL escape, DWORD keys) override {
     if (escape) return DRAGDROP_S_CANCEL;
     return keys & MK_LBUTTON ? S_OK : DRAGDROP_S_DROP;

@@ -279,7 +279,7 @@ TEST_F(DownloadDialog, EachFailureShowsItsTextAndStopsTheCalls) {
   }
 }
 
-// Each needs a fresh process in a folder of its own: run by the launcher below.
+// Each in a fresh process, in a folder of its own: run as tests of their own (comm.cmake).
 TEST_F(DownloadDialog, DISABLED_CancelBeforeStartNeverLoadsTheLibrary) {
   EXPECT_EQ(Run([&](HWND dialog) { Click(dialog, IDCANCEL); }), IDCANCEL);
   EXPECT_EQ(GetModuleHandleW(L"MarlixComm.dll"), nullptr);
@@ -294,41 +294,6 @@ TEST_F(DownloadDialog, DISABLED_MissingLibraryIsReportedWithItsPath) {
 
 TEST_F(DownloadDialog, DISABLED_LibraryWithoutCreateInstanceIsReportedWithoutPath) {
   EXPECT_EQ(StartAndReadFailure().text, kld::ft::BuildErrorText(HRESULT(0x8007007F), nullptr, nullptr, nullptr));
-}
-
-// Runs the one test DISABLED_`name` in a copy of this program in a fresh folder, with `dll` of this
-// folder beside it as MarlixComm.dll (none if empty). Whether it ran and passed.
-bool RunsInCopy(const wchar_t* dll, const std::string& name) {
-  fs::path folder = fs::temp_directory_path() / ("marlix_" + std::to_string(GetCurrentProcessId()) + name);
-  fs::create_directory(folder);
-  fs::copy_file(Self(), folder / "copy.exe", fs::copy_options::overwrite_existing);
-  if (*dll) fs::copy_file(Beside(dll), folder / "MarlixComm.dll", fs::copy_options::overwrite_existing);
-  std::wstring command = L"copy --gtest_also_run_disabled_tests --gtest_output=xml:result.xml "
-                         L"--gtest_filter=DownloadDialog.DISABLED_" + fs::path(name).wstring();
-  STARTUPINFOW startup{sizeof startup};
-  PROCESS_INFORMATION process{};
-  DWORD code = DWORD(-1);
-  if (CreateProcessW((folder / "copy.exe").c_str(), command.data(), nullptr, nullptr, FALSE, 0, nullptr, folder.c_str(),
-                     &startup, &process)) {
-    if (WaitForSingleObject(process.hProcess, 60000) != WAIT_OBJECT_0 || !GetExitCodeProcess(process.hProcess, &code))
-      TerminateProcess(process.hProcess, code = DWORD(-1));
-    CloseHandle(process.hThread);
-    CloseHandle(process.hProcess);
-  }
-  // gtest exits 0 when its filter matches nothing: a misspelt name must not pass.
-  std::ifstream result(folder / "result.xml");
-  const std::string xml{std::istreambuf_iterator<char>(result), {}};
-  const bool ran = xml.find("<testcase name=\"DISABLED_" + name + "\"") != std::string::npos;
-  result.close();
-  std::error_code ignored;
-  WaitFor([&] { return fs::remove_all(folder, ignored) != static_cast<std::uintmax_t>(-1); });  // once the copy's image is gone
-  return code == 0 && ran;
-}
-
-TEST(DownloadDialogFreshProcess, CancelBeforeStartMissingLibraryAndMissingExport) {
-  EXPECT_TRUE(RunsInCopy(L"MarlixComm.dll", "CancelBeforeStartNeverLoadsTheLibrary"));
-  EXPECT_TRUE(RunsInCopy(L"", "MissingLibraryIsReportedWithItsPath"));
-  EXPECT_TRUE(RunsInCopy(L"MarlixCommNoExport.dll", "LibraryWithoutCreateInstanceIsReportedWithoutPath"));
 }
 
 }  // namespace

@@ -20,8 +20,13 @@ bool WaitUntil(Condition condition, DWORD limitMs, const std::atomic<bool>& stop
   return true;
 }
 
-// As a click does: posted, so the user never waits for what the click sets off.
-inline void Click(HWND dialog, int id) { PostMessageW(GetDlgItem(dialog, id), BM_CLICK, 0, 0); }
+// A user's click: only on a control that shows and is enabled, and posted, so the user never
+// waits for what it sets off.
+inline void Click(HWND dialog, int id) {
+  HWND control = GetDlgItem(dialog, id);
+  if (IsWindowVisible(control) && IsWindowEnabled(control)) PostMessageW(control, BM_CLICK, 0, 0);
+  else ADD_FAILURE() << "control " << id << " cannot be clicked";
+}
 
 // Closes `window` as a user in a hurry would: confirms its message boxes and cancels it.
 inline void Dismiss(HWND window) {

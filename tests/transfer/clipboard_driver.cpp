@@ -1,4 +1,4 @@
-// A level's file copied to the clipboard pastes in another process as Explorer pastes it, with the job whole and no file left behind.
+// A level's file copied to the clipboard pastes whole in another process, as Explorer pastes it, leaving no file behind.
 // The driver puts the file of a level with the longest name on the clipboard, starts the file
 // receiver, which pastes it, and works its own download dialog meanwhile.
 #include <windows.h>

@@ -1,4 +1,4 @@
-// A surveyor's download: the dialog's texts and buttons, each failure's message, cancelling, and the library contract under it.
+// A surveyor's download: the dialog's texts and buttons, each failure's message, cancelling, the library contract.
 #include <gtest/gtest.h>
 
 #include <algorithm>

@@ -1,5 +1,5 @@
-// Drives the modal level sheet from a second thread as a person would: finds it, types,
-// picks list entries, switches tabs, presses its buttons and answers its message boxes.
+// Drives the modal level sheet from a second thread as a person would: types, picks list
+// entries, switches tabs and presses its buttons; reads back what the store holds.
 #pragma once
 #include <windows.h>
 #include <commctrl.h>
@@ -7,25 +7,25 @@
 
 #include <functional>
 #include <string>
-#include <thread>
 #include <vector>
 
 #include "config/station_dialog.h"
+#include "support/modal_user.h"
 #include "support/registry_sandbox.h"
-#include "support/window_waits.h"
 
 namespace sheet {
 
 using ui::OwnedDialog;
 using ui::Text;
 using ui::WaitFor;
+using Strings = std::vector<std::wstring>;
 
 // The page window at `index`, null while the page was never shown.
 inline HWND Page(HWND sheet, int index) {
   return reinterpret_cast<HWND>(SendMessageW(sheet, PSM_INDEXTOHWND, static_cast<WPARAM>(index), 0));
 }
 inline void ShowTab(HWND sheet, int index) { SendMessageW(sheet, PSM_SETCURSEL, static_cast<WPARAM>(index), 0); }
-inline void Press(HWND sheet, int id) { PostMessageW(GetDlgItem(sheet, id), BM_CLICK, 0, 0); }
+inline void Press(HWND sheet, int id) { user::Click(sheet, id); }
 inline bool ApplyEnabled(HWND sheet) { return IsWindowEnabled(GetDlgItem(sheet, 12321)) != FALSE; }
 inline std::wstring TabText(HWND sheet, int index) {
   wchar_t text[64] = {};
@@ -48,16 +48,14 @@ inline std::wstring Entry(HWND combo, LRESULT at) {
   SendMessageW(combo, CB_GETLBTEXT, static_cast<WPARAM>(at), reinterpret_cast<LPARAM>(text));
   return text;
 }
-
-inline std::vector<std::wstring> Entries(HWND page, int id) {
-  HWND combo = GetDlgItem(page, id);
-  std::vector<std::wstring> entries;
-  for (LRESULT i = 0, n = SendMessageW(combo, CB_GETCOUNT, 0, 0); i < n; ++i) entries.push_back(Entry(combo, i));
+inline Strings Entries(HWND page, int id) {
+  Strings entries;
+  for (LRESULT i = 0, n = SendDlgItemMessageW(page, id, CB_GETCOUNT, 0, 0); i < n; ++i)
+    entries.push_back(Entry(GetDlgItem(page, id), i));
   return entries;
 }
-
 inline std::wstring Selected(HWND page, int id) {
-  LRESULT at = SendMessageW(GetDlgItem(page, id), CB_GETCURSEL, 0, 0);
+  LRESULT at = SendDlgItemMessageW(page, id, CB_GETCURSEL, 0, 0);
   return at == CB_ERR ? L"<none>" : Entry(GetDlgItem(page, id), at);
 }
 
@@ -70,40 +68,15 @@ inline void Pick(HWND page, int id, const std::wstring& entry) {
   SendMessageW(page, WM_COMMAND, MAKEWPARAM(id, CBN_SELCHANGE), reinterpret_cast<LPARAM>(combo));
 }
 
-// Waits for the message box the sheet owns, checks its caption and icon, dismisses it, returns its text.
-inline std::wstring ReadBox(HWND sheet, const std::wstring& caption) {
-  HWND box = nullptr;
-  if (!WaitFor([&] { return (box = OwnedDialog(sheet)) != nullptr; })) return L"(no message box)";
-  EXPECT_EQ(Text(box), caption);
-  HWND icon = GetDlgItem(box, 0x14) ? GetDlgItem(box, 0x14) : GetDlgItem(box, 0x440);  // Windows' id, Wine's
-  EXPECT_EQ(reinterpret_cast<HICON>(SendMessageW(icon, STM_GETICON, 0, 0)), LoadIconW(nullptr, IDI_ERROR));
-  std::wstring text = Text(box, 0xFFFF);
-  PostMessageW(box, WM_COMMAND, IDOK, 0);
-  WaitFor([&] { return !IsWindow(box); });
-  return text;
-}
-
-// Runs the sheet modally here and `script` on a second thread. A sheet that the script
-// leaves open is a failure, and is cancelled.
+// Runs the sheet modally here and `script` on a second thread, as its user.
 inline INT_PTR RunSheet(CStationRecord& record, bool newLevel, const std::function<void(HWND)>& script) {
   CStationDialog dialog(nullptr, record, newLevel);
-  std::thread driver([&] {
-    HWND window = nullptr;
-    ASSERT_TRUE(WaitFor([&] { return (window = OwnedDialog(nullptr)) != nullptr; })) << "no sheet";
-    EXPECT_EQ(window, dialog.Handle());
-    script(window);
-    if (WaitFor([&] { return !IsWindow(window); })) return;
-    ADD_FAILURE() << "the sheet stayed open";
-    PostMessageW(window, WM_COMMAND, IDCANCEL, 0);
-  });
-  INT_PTR result = dialog.DoModal();
-  driver.join();
-  return result;
+  return user::RunModal([&] { return dialog.DoModal(); }, script);
 }
 
 // Every stored level, as "name|port|baud|stop|parity|data|flow|checksum|note|model", read from the registry.
-inline std::vector<std::wstring> StoredLevels() {
-  std::vector<std::wstring> levels;
+inline Strings StoredLevels() {
+  Strings levels;
   HKEY key = nullptr;
   if (RegOpenKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, KEY_READ, &key) != ERROR_SUCCESS) return levels;
   wchar_t name[300];
@@ -127,8 +100,19 @@ inline void SetSerialPorts(const std::vector<std::pair<std::wstring, std::wstrin
   for (const auto& [name, port] : ports) RegWriteString(HKEY_LOCAL_MACHINE, path, name.c_str(), port);
 }
 
-// Saves what the screen shows of `window` as a 24-bit BMP (for the pictures in docs/).
+// Whether `window` and every window in it have painted what they show.
+inline bool Painted(HWND window) {
+  BOOL painted = !GetUpdateRect(window, nullptr, FALSE);
+  EnumChildWindows(window, [](HWND child, LPARAM all) {
+    if (GetUpdateRect(child, nullptr, FALSE)) *reinterpret_cast<BOOL*>(all) = FALSE;
+    return TRUE;
+  }, reinterpret_cast<LPARAM>(&painted));
+  return painted != FALSE;
+}
+
+// Saves what the screen shows of `window`, once painted, as a 24-bit BMP (for the pictures in docs/).
 inline bool SaveScreenshot(HWND window, const std::wstring& path) {
+  if (!WaitFor([&] { return Painted(window); })) return false;
   RECT r{};
   GetWindowRect(window, &r);
   const int width = r.right - r.left, height = r.bottom - r.top, stride = (width * 3 + 3) & ~3;
@@ -165,10 +149,8 @@ inline void TakeScreenshots(const std::wstring& prefix) {
   ASSERT_EQ(AddStation(level), S_OK);
   RunSheet(level, false, [&](HWND window) {
     SetWindowPos(window, HWND_TOP, 20, 20, 0, 0, SWP_NOSIZE);
-    Sleep(700);
     EXPECT_TRUE(SaveScreenshot(window, std::wstring(folder) + L"\\" + prefix + L"-general.bmp"));
     ShowTab(window, 1);
-    Sleep(700);
     EXPECT_TRUE(SaveScreenshot(window, std::wstring(folder) + L"\\" + prefix + L"-advanced.bmp"));
     Press(window, IDCANCEL);
   });

@@ -1,7 +1,6 @@
-// Two processes and the real OLE clipboard. The driver puts the file of a level with the longest
-// name on the clipboard, starts the file receiver, which pastes it as Explorer would, and works
-// its own download dialog meanwhile; then it checks the bytes the receiver wrote and that no
-// file stays.
+// A level's file copied to the clipboard pastes whole in another process, as Explorer pastes it, leaving no file behind.
+// The driver puts the file of a level with the longest name on the clipboard, starts the file
+// receiver, which pastes it, and works its own download dialog meanwhile.
 #include <windows.h>
 #include <ole2.h>
 #include <process.h>
@@ -11,8 +10,10 @@
 #include <cwchar>
 
 #include "data_test_support.h"
+#include "base/resource_ids.h"
 #include "base/win_handles.h"
 #include "store/station_record.h"
+#include "support/modal_user.h"
 #include "support/registry_sandbox.h"
 #include "transfer/data_object.h"
 
@@ -34,20 +35,22 @@ int Owner(const wchar_t* receiver) {
     data->AddItem(win::UniqueCoMem<ITEMIDLIST>(MakeFullList(level.Name, true)).Get());
     if (HRESULT hr = OleSetClipboard(data.Get()); FAILED(hr)) return Fail("OleSetClipboard", hr);
   }  // the clipboard holds the only reference now
-  DialogDriver driver(220, {}, 60000);
   const std::wstring folder = TempDir() + L"marlix_paste_" + std::to_wstring(GetCurrentProcessId());
   CreateDirectoryW(folder.c_str(), nullptr);
   HANDLE reader = HANDLE(_wspawnl(_P_NOWAIT, receiver, L"receiver", L"paste", folder.c_str(), nullptr));
   if (reader == INVALID_HANDLE_VALUE) return Fail("starting the reader");
-  DWORD index, readerCode = 1;  // the apartment serves the reader's calls until it ends
-  if (CoWaitForMultipleHandles(COWAIT_DISPATCH_WINDOW_MESSAGES | COWAIT_DISPATCH_CALLS, 60000, 1,
-                               &reader, &index) != S_OK)
-    TerminateProcess(reader, 99);
+  bool started = false;
+  DWORD readerCode = 1;
+  user::RunModal([&] {  // the apartment serves the reader's calls until it ends
+    DWORD index;
+    if (CoWaitForMultipleHandles(COWAIT_DISPATCH_WINDOW_MESSAGES | COWAIT_DISPATCH_CALLS, 60000, 1, &reader, &index) != S_OK)
+      TerminateProcess(reader, 99);
+    return INT_PTR(0);
+  }, [&](HWND dialog) { started = true; user::Click(dialog, IDC_TRANSFER_START); }, nullptr, 60000);
   GetExitCodeProcess(reader, &readerCode);
   CloseHandle(reader);
-  const bool clicked = driver.Finish();
   OleSetClipboard(nullptr);
-  if (!clicked) return Fail("download dialog never came up");
+  if (!started) return Fail("download dialog never came up");
   if (readerCode != 0) return Fail("reader", long(readerCode));
   if (TransferFiles() != before) return Fail("a temporary .txt file stayed behind");
   std::vector<char> bytes;

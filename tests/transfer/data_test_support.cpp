@@ -1,10 +1,10 @@
+// Shared pieces of the transfer tests, built as the shell and the instrument would hand them over.
 #include "data_test_support.h"
 
 #include <cstring>
 #include <filesystem>
 
 #include "tools/marlix_comm/survey_job.h"
-#include "transfer/download_dialog.h"
 
 FORMATETC Request(const wchar_t* format, DWORD tymed, LONG index) {
   return {CLIPFORMAT(RegisterClipboardFormatW(format)), nullptr, DVASPECT_CONTENT, index, tymed};
@@ -29,22 +29,6 @@ LPITEMIDLIST MakeFullList(const std::wstring& level, bool withFile) {
                                            : IdList({{1, L"Marlix Digital Levels"}, {2, level}});
   return static_cast<LPITEMIDLIST>(std::memcpy(CoTaskMemAlloc(bytes.size()), bytes.data(), bytes.size()));
 }
-
-DialogDriver::DialogDriver(int button, std::function<void()> whileOpen, DWORD limitMs)
-    : whileOpen_(std::move(whileOpen)), thread_([this, button, limitMs, owner = GetCurrentThreadId()] {
-        for (ULONGLONG end = GetTickCount64() + limitMs; !stop_ && GetTickCount64() < end; Sleep(10)) {
-          HWND dialog = DownloadDialogWindow;
-          if (clicked_ || !dialog || !IsWindowVisible(dialog)) continue;
-          if (whileOpen_) whileOpen_();
-          SendMessageW(GetDlgItem(dialog, button), BM_CLICK, 0, 0);
-          clicked_ = true;
-        }
-        for (; !stop_; Sleep(50))
-          EnumThreadWindows(owner, [](HWND w, LPARAM) {
-            if (IsWindowVisible(w)) PostMessageW(w, WM_COMMAND, w == DownloadDialogWindow ? IDCANCEL : IDOK, 0);
-            return TRUE;
-          }, 0);
-      }) {}
 
 std::vector<char> ReadAll(IStream* stream) {
   std::vector<char> all;

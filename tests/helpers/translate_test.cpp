@@ -1,4 +1,4 @@
-// Translation files: their syntax, where they are found, and the texts they give.
+// A user's translation file gives the module's texts in their language, and bad files never crash it.
 #include <gtest/gtest.h>
 #include <atomic>
 #include <random>

@@ -1,13 +1,15 @@
-// Twenty processes work on one store at once, through the store's own operations.
+// Levels added, renamed and deleted from twenty programs at once are neither lost nor doubled.
 // The parent starts copies of this program, each running the Child test on the parent's
 // sandbox; all start together, and all check their view once every one has finished.
 #include <gtest/gtest.h>
 #include <cstdio>
 #include <map>
+#include <memory>
 #include <string>
 #include <vector>
 #include "base/win_handles.h"
 #include "store/station_record.h"
+#include "support/child_process.h"
 #include "support/registry_sandbox.h"
 namespace {
 constexpr int kProcesses = 20;
@@ -101,18 +103,13 @@ TEST(StoreProcesses, TwentyAtOnce) {
   win::UniqueHandle go(CreateEventW(nullptr, TRUE, FALSE, (barrier + L"go").c_str()));
   win::UniqueHandle check(CreateEventW(nullptr, TRUE, FALSE, (barrier + L"check").c_str()));
   win::UniqueHandle done(CreateSemaphoreW(nullptr, 0, kProcesses, (barrier + L"done").c_str()));
-  wchar_t self[MAX_PATH] = {};
-  GetModuleFileNameW(nullptr, self, MAX_PATH);
-  std::vector<HANDLE> children;
+  std::vector<std::unique_ptr<child::Process>> children;
   for (int i = 0; i < kProcesses; ++i) {
     SetEnvironmentVariableW(kChildVariable, (std::to_wstring(i) + L"|" + barrier + L"|" +
                                              sandbox.ScratchPath(HKEY_CURRENT_USER)).c_str());
-    std::wstring command = L"\"" + std::wstring(self) + L"\" --gtest_filter=StoreProcesses.Child";
-    STARTUPINFOW startup{sizeof(startup)};
-    PROCESS_INFORMATION process{};
-    ASSERT_TRUE(CreateProcessW(self, command.data(), nullptr, nullptr, FALSE, 0, nullptr, nullptr, &startup, &process));
-    CloseHandle(process.hThread);
-    children.push_back(process.hProcess);
+    children.push_back(std::make_unique<child::Process>(child::SelfPath(),
+                                                        std::vector<std::wstring>{L"--gtest_filter=StoreProcesses.Child"}));
+    ASSERT_TRUE(children.back()->Started());
   }
   SetEnvironmentVariableW(kChildVariable, nullptr);
   const ULONGLONG start = GetTickCount64();
@@ -132,12 +129,9 @@ TEST(StoreProcesses, TwentyAtOnce) {
   EXPECT_EQ(count.size(), kept) << "levels lost or left over";
   EXPECT_GE(sharedAdds, 1);
   SetEvent(check.Get());
-  EXPECT_EQ(WaitForMultipleObjects(kProcesses, children.data(), TRUE, 120000), WAIT_OBJECT_0);
-  for (HANDLE child : children) {
-    DWORD code = 1;
-    GetExitCodeProcess(child, &code);
-    EXPECT_EQ(code, 0u) << "a process's view of the store was not as its operations said";
-    CloseHandle(child);
+  for (auto& process : children) {
+    ASSERT_TRUE(process->Wait(120000));
+    EXPECT_EQ(process->ExitCode(), 0u) << "a process's view of the store was not as its operations said";
   }
   std::printf("[ figures  ] %d processes, %d levels added, %zu kept (%d renames or deletes stepped over), "
               "%d adds of one name kept, %llu ms\n",

@@ -2,7 +2,6 @@
 // The parent starts copies of this program, each running the Child test on the parent's
 // sandbox; all start together, and all check their view once every one has finished.
 #include <gtest/gtest.h>
-#include <cstdio>
 #include <map>
 #include <memory>
 #include <string>
@@ -75,7 +74,6 @@ TEST(StoreProcesses, Child) {
       EXPECT_EQ(FindStation(gone), E_FAIL) << testing::PrintToString(name);
     }
   }
-  std::printf("[ child    ] %d: %zu levels of its own\n", me, expected.size());
 }
 // Every key's Name, in enumeration order.
 std::vector<std::wstring> StoredNames() {
@@ -112,11 +110,9 @@ TEST(StoreProcesses, TwentyAtOnce) {
     ASSERT_TRUE(children.back()->Started());
   }
   SetEnvironmentVariableW(kChildVariable, nullptr);
-  const ULONGLONG start = GetTickCount64();
   SetEvent(go.Get());
   int finished = 0;
   while (finished < kProcesses && WaitForSingleObject(done.Get(), 120000) == WAIT_OBJECT_0) ++finished;
-  const ULONGLONG busy = GetTickCount64() - start;
   EXPECT_EQ(finished, kProcesses);
   // One name per key: no add lost a level to another, and none is left half written.
   std::map<std::wstring, int> count;
@@ -133,9 +129,5 @@ TEST(StoreProcesses, TwentyAtOnce) {
     ASSERT_TRUE(process->Wait(120000));
     EXPECT_EQ(process->ExitCode(), 0u) << "a process's view of the store was not as its operations said";
   }
-  std::printf("[ figures  ] %d processes, %d levels added, %zu kept (%d renames or deletes stepped over), "
-              "%d adds of one name kept, %llu ms\n",
-              kProcesses, kProcesses * kLevelsEach, count.size(), int(count.size()) - kProcesses * (kLevelsEach - 3),
-              sharedAdds, busy);
 }
 }  // namespace

@@ -45,9 +45,6 @@ TEST_F(Store, PathsParsingNameAndValidity) {
   List full(m.CreateListFromPath(L"/Marlix Digital Levels/L1/file1.tkf"));
   UINT needed = m.GetPath(full.Get(), nullptr, 0);
   EXPECT_EQ(needed, 21u + 1 + 2 + 1 + 9 + 1 + 1);
-  std::vector<wchar_t> exact(needed);
-  EXPECT_EQ(m.GetPath(full.Get(), exact.data(), needed), needed - 2);
-  EXPECT_STREQ(exact.data(), L"Marlix Digital Levels\\L1\\file1.tkf");
   std::vector<wchar_t> small(8, 0x5555);
   EXPECT_EQ(m.GetPath(full.Get(), small.data(), 6), 5u);
   EXPECT_STREQ(small.data(), L"Marli") << "a destination too small gets a cut, terminated text";
@@ -87,15 +84,7 @@ TEST_F(Store, AddWritesEveryValueAndFindReadsThemBack) {
   CStationRecord added = Full(L"Level one", 10);
   ASSERT_EQ(AddStation(added), S_OK);
   CStationRecord found = Named(L"Level one");
-  std::wstring key(260, L'x');
-  for (auto [given, text, back] : {std::tuple<DWORD, const wchar_t*, DWORD>{3, L"Staxxxxxxx", 4},
-                                   {0, L"Staxxxxxxx", 0},
-                                   {260, L"Station 0", 10}}) {
-    DWORD length = given;
-    ASSERT_EQ(FindStation(found, key.data(), &length), S_OK);
-    EXPECT_EQ(std::make_pair(std::wstring(key.c_str()).substr(0, 10), length), std::make_pair(std::wstring(text), back))
-        << given << ": a short buffer gets the key name cut as wcsncpy does; a zero length leaves it alone";
-  }
+  ASSERT_EQ(FindStation(found), S_OK);
   EXPECT_TRUE(Fields(found) == Fields(added));
   CStationRecord again = Named(L"Level one");
   EXPECT_EQ(AddStation(again), E_INVALIDARG);

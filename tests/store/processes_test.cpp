@@ -12,7 +12,7 @@
 #include "support/registry_sandbox.h"
 namespace {
 constexpr int kProcesses = 20;
-constexpr int kLevelsEach = 10;
+constexpr int kLevelsEach = 12;
 const wchar_t kResults[] = L"Software\\Marlix store processes";
 const wchar_t kChildVariable[] = L"MARLIX_STORE_CHILD";  // "<index>|<barrier prefix>|<scratch key>"
 std::wstring Variable(const wchar_t* name) {
@@ -53,7 +53,7 @@ TEST(StoreProcesses, Child) {
   for (int k = 0; k < kLevelsEach / 2; ++k)
     if (UpdateStation(LevelName(me, k, false), Level(LevelName(me, k, true), me * 100 + k)) == S_OK)
       expected[LevelName(me, k, true)] = expected[LevelName(me, k, false)], expected.erase(LevelName(me, k, false));
-  for (int k = kLevelsEach / 2; k < kLevelsEach * 4 / 5; ++k)
+  for (int k = kLevelsEach / 2; k < kLevelsEach; ++k)
     if (DeleteStation(Level(LevelName(me, k, false), 0)) == S_OK) expected.erase(LevelName(me, k, false));
   CStationRecord shared = Level(L"shared", 0);
   AddStation(shared);

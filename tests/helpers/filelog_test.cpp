@@ -1,10 +1,9 @@
-// A support engineer's log: one UTC-stamped entry per call, errors with their details, and a stack dump.
+// A support engineer's log: one UTC-stamped entry per call, and errors with their details in order.
 #include <gtest/gtest.h>
 #include <windows.h>
 #include <oleauto.h>
 #include <regex>
 #include "helpers/filelog.h"
-#include "helpers/stack_dump.h"
 #include "test_files.h"
 using namespace kld::ft;
 namespace {
@@ -16,13 +15,6 @@ bool Has(const std::string& text, const std::string& part) { return text.find(pa
 struct Filelog : testing::Test {
   void SetUp() override { ASSERT_TRUE(StartFilelog(L"marlix_logtest", true)); }
   void TearDown() override { StopFilelog(), DeleteFileW(LogPath().c_str()); }
-};
-struct Collector : CStackDumpHandler {
-  void OnBegin() override { ++begins; }
-  void OnFrame(std::uint64_t, const char* symbol, const char*) override { frames += (symbol ? symbol : "") + std::string("\n"); }
-  void OnEnd() override { ++ends; }
-  std::string frames;
-  int begins = 0, ends = 0;
 };
 }  // namespace
 TEST_F(Filelog, EntriesCarryOnePrefixAndIndentFurtherLines) {
@@ -93,29 +85,4 @@ TEST_F(Filelog, RestartDeletesOldLogsAndErrorsKeepTheirDetailOrder) {
   ASSERT_NE(object, std::string::npos) << text;
   EXPECT_LT(internal, system) << "the detail lines keep their order";
   EXPECT_LT(system, object) << "the detail lines keep their order";
-}
-// Kept out of line so that it stands as a frame of its own in the trace.
-extern "C" __attribute__((noinline)) void MarlixStackProbe(Collector* collector) {
-  DumpThreadStack({GetCurrentThread(), collector});
-  asm volatile("");
-}
-TEST(StackDump, NamesTheCallersOwnFunctionAndDumpsOtherThreads) {
-  Collector own, other;
-  MarlixStackProbe(&own);
-  EXPECT_EQ(std::make_pair(own.begins, own.ends), std::make_pair(1, 1));
-  EXPECT_TRUE(Has(own.frames, "MarlixStackProbe")) << own.frames;
-  // Another thread, waiting, is suspended in place and goes on afterwards.
-  static HANDLE waiting, go;
-  waiting = CreateEventW(nullptr, TRUE, FALSE, nullptr);
-  go = CreateEventW(nullptr, TRUE, FALSE, nullptr);
-  HANDLE thread = CreateThread(nullptr, 0, [](void*) -> DWORD {
-    return SignalObjectAndWait(waiting, go, INFINITE, FALSE);
-  }, nullptr, 0, nullptr);
-  ASSERT_EQ(WaitForSingleObject(waiting, 5000), WAIT_OBJECT_0);
-  DumpThreadStack({thread, &other});
-  EXPECT_EQ(other.ends, 1);
-  EXPECT_FALSE(other.frames.empty());
-  SetEvent(go);
-  EXPECT_EQ(WaitForSingleObject(thread, 5000), WAIT_OBJECT_0);
-  CloseHandle(thread), CloseHandle(go), CloseHandle(waiting);
 }

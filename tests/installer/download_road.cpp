@@ -160,6 +160,12 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
       Say("   the download dialog is still open after a minute: cancelled");
       step = 5;
       PostMessageW(dialog, WM_COMMAND, IDCANCEL, 0);
+      // A dialog that cannot even be cancelled holds this thread's drop for good: end here.
+      if (!ui::WaitFor([&] { return !IsWindow(dialog); }, 10000)) {
+        std::printf("FAIL: the download dialog neither ends nor cancels\n");
+        std::fflush(stdout);
+        TerminateProcess(GetCurrentProcess(), 1);
+      }
     }
   });
 

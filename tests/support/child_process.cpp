@@ -1,3 +1,4 @@
+// Starting and ending the programs a test drives beside itself, with a deadline on each wait.
 #include "support/child_process.h"
 
 namespace child {

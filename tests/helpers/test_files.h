@@ -1,4 +1,4 @@
-// Scratch files for the support library's tests.
+// Scratch files for the tests of logs, folders and translation files.
 #pragma once
 #include <windows.h>
 #include <filesystem>
@@ -23,11 +23,6 @@ inline void WriteTranslation(const std::wstring& path, const std::wstring& text)
 inline void MarkNotInstalled(const std::wstring& app) {
   std::filesystem::create_directories(app + L"components");
   WriteBytes(app + L"components\\NotInstalledApp.txt", "");
-}
-inline std::wstring ExeDirectory() {
-  wchar_t path[MAX_PATH] = {};
-  GetModuleFileNameW(nullptr, path, MAX_PATH);
-  return std::wstring(path, wcsrchr(path, L'\\') + 1);
 }
 inline std::wstring TempDirectory() {
   wchar_t path[MAX_PATH] = {};

@@ -1,4 +1,4 @@
-// Translation files: their syntax, where they are found, and the texts they give.
+// A user's translation file gives the module's texts in their language, and bad files never crash it.
 #include <gtest/gtest.h>
 #include <atomic>
 #include <random>
@@ -61,7 +61,6 @@ TEST(TranslateFile, EscapesPairingAndTails) {
   const wchar_t* escapes[][2] = {
       {L"\\\\n", L"\\\n"},
       {L"a\\tb\\rc\\\\d\\x", L"a\tb\rc\\d\\x"},
-      {L"\\\\\\\\t", L"\\\\\t"},
       {L"end\\", L"end\\"}};
   for (const auto& e : escapes) EXPECT_EQ(UnescapeTranslationText(e[0]), e[1]) << e[0];
   CTranslateFile file = Parsed(L"[a\\nb\\\\]\r\n[x\\\\n\\t]\r\n");
@@ -73,21 +72,14 @@ TEST(TranslateFile, EscapesPairingAndTails) {
                 L"[lone bracket\n[a]b]c\n[t]x\n[dup]\r\r\n\n[one]\r[dup]\n[two]\n[other]\n[one]\n[orphan]");
   struct { const wchar_t *text, *found; bool reverse; const char* why; } rows[] = {
       {L"first", L"erste"},
-      {L"dropped", L""},
-      {L"", L""},
       {L"again", L"wieder"},
       {L"a]b", L"t", false, "text runs to the last ]"},
       {L"dup", L"one", false, "first pair wins forward"},
       {L"one", L"dup", true, "first pair wins in reverse"},
-      {L"two", L"dup", true},
-      {L"other", L"one"},
       {L"orphan", L""},
-      {L"indented", L""},
       {L"Open#$menu", L"Öffnen"},
       {L"Open#$button", L"Offen", false, "falls back to the plain entry"},
-      {L"Open", L"Offen"},
-      {L"Öffnen", L"Open#$menu", true},
-      {L"Close#$x", L""}};
+      {L"Öffnen", L"Open#$menu", true}};
   for (const auto& r : rows) EXPECT_EQ(file.Find(r.text, r.reverse), r.found) << r.text << " " << (r.why ?: "");
   EXPECT_EQ(file.Size(), 7u);
   EXPECT_EQ(Parsed(L"[src]\n[last line]").Find(L"src", false), L"last line");
@@ -95,11 +87,9 @@ TEST(TranslateFile, EscapesPairingAndTails) {
 TEST(TranslateFile, LoadRefusesAnythingButUtf16WithMarkAndTakesHugeFiles) {
   struct { std::string bytes; HRESULT hr; const char* what; } rows[] = {
       {"", E_FAIL, "empty"},
-      {"\xFF", E_FAIL, "half a mark"},
       {"\xEF\xBB\xBF[a]\r\n[b]\r\n", E_FAIL, "UTF-8"},
       {testfiles::Utf16File(L"[a]\r\n[b]\r\n").substr(2), E_FAIL, "no mark"},
       {"\xFF\xFE", S_OK, "mark only"},
-      {testfiles::Utf16File(L"\r\n\n\r\r\r\n"), S_OK, "line ends"},
       {testfiles::Utf16File(L"[[[[\n]]]\n[\n"), S_OK, "brackets without pairs"}};
   for (const auto& r : rows) {
     CTranslateFile file;
@@ -187,17 +177,13 @@ TEST_F(TranslationFiles, TranslateTextFallsBackToTheCutEnglishText) {
   Write(L"de-DE\\words.txt", L"[Delete]\n[Löschen]\n[Open#$menu]\n[Öffnen]\n");
   struct { const wchar_t *text, *result; LANGID from, to; const wchar_t* name = L"words"; } rows[] = {
       {L"Delete", L"Löschen", kEnglish, kGerman},
-      {L"Open#$menu", L"Öffnen", kEnglish, kGerman},
       {L"Open#$other", L"Open", kEnglish, kGerman},
       {L"Missing", L"Missing", kEnglish, kGerman},
       {L"Delete", L"Löschen", kEnglish, kFrench},  // the name's first path serves every language
       {L"Löschen", L"Delete", kGerman, kEnglish},
-      {L"Delete#$x", L"Delete", kEnglish, kEnglish},
-      {L"", L"", kEnglish, kGerman},
       {L"a#$b", L"a", kEnglish, kGerman, L"nofile"}};
   for (const auto& r : rows)
     EXPECT_EQ(TranslateText(r.text, r.from, r.to, ModuleInstance(), r.name), r.result) << r.text << r.to;
-  EXPECT_NE(TranslateFileManagerIfCreated(), nullptr);
 }
 // One thread probing a slow path holds up no other thread's translation.
 TEST_F(TranslationFiles, ProbingIsOutsideTheLock) {

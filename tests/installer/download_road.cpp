@@ -1,11 +1,11 @@
-// The whole road of one download on the installed product, as a surveyor takes it:
+// A surveyor downloads one job on the installed product, from the folder to the receiving program.
 // Wine's ExplorerBrowser opens "Marlix Digital Levels", the add row opens the property
 // sheet, a new level is saved and opened, and file1.tkf is dragged to another program's
 // window, which takes it as Explorer would; the download dialog shows the level's
 // instructions, Start is pressed and the practice instrument sends its job.
 // Every action is real mouse input or a key typed into a control, from a second thread
 // while this one runs the browser; nothing of ours stands between the steps.
-//   download_road <shell_peer.exe> <receiving folder> <screenshot folder> [pause ms]
+//   download_road <shell_peer.exe> <receiving folder> <screenshot folder>
 // Says each step on the terminal, saves a picture of the screen after each (BMP), and
 // exits 0 only if the job arrived whole and no temporary file stayed behind.
 #include <windows.h>
@@ -22,6 +22,8 @@
 #include <vector>
 
 #include "base/resource_ids.h"
+#include "support/child_process.h"
+#include "support/window_waits.h"
 #include "store/string_table.h"
 #include "transfer/data_test_support.h"
 
@@ -30,7 +32,6 @@ namespace {
 const wchar_t kFolder[] = L"::{20D04FE0-3AEA-1069-A2D8-08002B30309D}\\::{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}";
 const wchar_t kLevel[] = L"Road Level";
 std::wstring g_shots;
-int g_pause = 0;
 int g_shot = 0;
 int g_failures = 0;
 
@@ -69,49 +70,6 @@ void Shot(const wchar_t* name) {
   ReleaseDC(nullptr, screen);
 }
 
-// This thread's side: messages, input and the calls of other processes go on.
-bool Pump(const std::function<bool()>& done, DWORD milliseconds = 30000) {
-  for (DWORD start = GetTickCount(); !done();) {
-    if (GetTickCount() - start > milliseconds) return false;
-    MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT);
-    for (MSG msg; PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE);) {
-      TranslateMessage(&msg);
-      DispatchMessageW(&msg);
-    }
-  }
-  return true;
-}
-
-// The person's side, on a thread of its own: waits without pumping.
-template <class Condition>
-bool WaitFor(Condition condition, DWORD milliseconds = 30000) {
-  for (DWORD start = GetTickCount(); !condition(); Sleep(20))
-    if (GetTickCount() - start > milliseconds) return false;
-  return true;
-}
-
-void Mouse(DWORD flags, POINT at) {
-  INPUT input{INPUT_MOUSE};
-  input.mi.dx = at.x * 65535 / (GetSystemMetrics(SM_CXSCREEN) - 1);
-  input.mi.dy = at.y * 65535 / (GetSystemMetrics(SM_CYSCREEN) - 1);
-  input.mi.dwFlags = flags | MOUSEEVENTF_MOVE | MOUSEEVENTF_ABSOLUTE;
-  SendInput(1, &input, sizeof(input));
-}
-void Click(POINT at, int times = 1) {
-  Mouse(0, at);
-  Sleep(100);
-  for (int i = 0; i < times; ++i) {
-    Mouse(MOUSEEVENTF_LEFTDOWN, at);
-    Mouse(MOUSEEVENTF_LEFTUP, at);
-    Sleep(50);
-  }
-}
-POINT Centre(HWND window) {
-  RECT rect{};
-  GetWindowRect(window, &rect);
-  return {(rect.left + rect.right) / 2, (rect.top + rect.bottom) / 2};
-}
-
 // The list of the browser's current view.
 HWND CurrentList(IExplorerBrowser* browser) {
   IShellView* view = nullptr;
@@ -137,21 +95,6 @@ POINT RowPoint(HWND list, int row) {
   return point;
 }
 
-// A visible dialog of this process with a child of id `control`.
-HWND DialogWith(int control) {
-  DWORD process = 0;
-  for (HWND found = nullptr; (found = FindWindowExW(nullptr, found, L"#32770", nullptr));)
-    if (IsWindowVisible(found) && GetWindowThreadProcessId(found, &process) && process == GetCurrentProcessId() &&
-        GetDlgItem(found, control))
-      return found;
-  return nullptr;
-}
-
-void Type(HWND edit, const wchar_t* text) {
-  SendMessageW(edit, EM_SETSEL, 0, -1);
-  for (const wchar_t* c = text; *c; ++c) SendMessageW(edit, WM_CHAR, *c, 0);
-}
-
 int Road(const std::wstring& peer, const std::wstring& receiving) {
   const std::set<std::wstring> temporaryBefore = TransferFiles();
   HWND frame = CreateWindowExW(0, L"STATIC", L"Marlix Digital Levels", WS_POPUP | WS_VISIBLE | WS_BORDER, 0, 0, 600,
@@ -170,84 +113,82 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
   Check(browser->BrowseToIDList(folder, SBSP_ABSOLUTE) == S_OK, "the browser opens the folder");
   CoTaskMemFree(folder);
   HWND root = nullptr;
-  Check(Pump([&] { return (root = CurrentList(browser)) && RowOf(root, L"Add New Digital Level") == 0; }),
+  Check(ui::PumpFor([&] { return (root = CurrentList(browser)) && RowOf(root, L"Add New Digital Level") == 0; }),
         "the root lists the add row first");
-  Pump([] { return false; }, 300 + g_pause);
+  ui::PumpFor([&] { return ui::Painted(frame); });
   Shot(L"folder");
 
   std::atomic<int> step{0};
   std::wstring instructions;
   std::thread person([&] {
     Say("2. A double click on \"Add New Digital Level\" opens the property sheet");
-    Click(RowPoint(root, 0), 2);
+    ui::Click(RowPoint(root, 0), 2);
     HWND sheet = nullptr;
-    if (!WaitFor([&] { return (sheet = DialogWith(IDOK)) && PropSheet_GetCurrentPageHwnd(sheet); })) return;
+    if (!ui::WaitFor([&] { return (sheet = ui::DialogWith(IDOK)) && PropSheet_GetCurrentPageHwnd(sheet); })) return;
     HWND page = PropSheet_GetCurrentPageHwnd(sheet);
-    Type(GetDlgItem(page, IDC_STATION_NAME), kLevel);
-    Type(GetDlgItem(page, IDC_STATION_NOTE), L"Practice instrument");
+    ui::Type(GetDlgItem(page, IDC_STATION_NAME), kLevel);
+    ui::Type(GetDlgItem(page, IDC_STATION_NOTE), L"Practice instrument");
     HWND models = GetDlgItem(page, IDC_STATION_MODEL);
     SendMessageW(models, CB_SETCURSEL, SendMessageW(models, CB_FINDSTRINGEXACT, WPARAM(-1),
                                                       LPARAM(LoadTranslatedString(IDS_MODEL_HRB1X).c_str())), 0);
     SendMessageW(page, WM_COMMAND, MAKEWPARAM(IDC_STATION_MODEL, CBN_SELCHANGE), LPARAM(models));
-    Sleep(300 + g_pause);
+    ui::WaitFor([&] { return ui::Painted(sheet); });
     Shot(L"sheet");
     Say("   the sheet is filled in and closed with OK");
-    Click(Centre(GetDlgItem(sheet, IDOK)));
+    ui::Click(ui::Centre(GetDlgItem(sheet, IDOK)));
     step = 1;
-    if (!WaitFor([&] { return step == 2; })) return;
+    if (!ui::WaitFor([&] { return step == 2; })) return;
     Say("4. A double click on the new level opens it");
-    Click(RowPoint(root, RowOf(root, kLevel)), 2);
-    if (!WaitFor([&] { return step == 3; })) return;
+    ui::Click(RowPoint(root, RowOf(root, kLevel)), 2);
+    if (!ui::WaitFor([&] { return step == 3; })) return;
     HWND list = CurrentList(browser);
     Say("5. file1.tkf is dragged to a folder window of another program");
     POINT from = RowPoint(list, 0), to{800, 175};
-    Mouse(0, from);
-    Sleep(200);
-    Mouse(MOUSEEVENTF_LEFTDOWN, from);
-    for (int i = 1; i <= 20; ++i) {
-      Sleep(40);
-      Mouse(0, {from.x + (to.x - from.x) * i / 20, from.y + (to.y - from.y) * i / 20});
-    }
-    Sleep(200);
-    Mouse(MOUSEEVENTF_LEFTUP, to);
+    ui::Drag(from, to);
     HWND dialog = nullptr;
-    if (!WaitFor([&] { return (dialog = DialogWith(IDC_TRANSFER_START)); })) return;
+    if (!ui::WaitFor([&] { return (dialog = ui::DialogWith(IDC_TRANSFER_START)); })) return;
     wchar_t text[2048] = {};
     GetDlgItemTextW(dialog, IDC_TRANSFER_INSTRUCTIONS, text, 2048);
     instructions = text;
-    Sleep(300 + g_pause);
+    ui::WaitFor([&] { return ui::Painted(dialog); });
     Shot(L"download");
     Say("6. The download dialog shows the level's instructions; Start is pressed");
-    Click(Centre(GetDlgItem(dialog, IDC_TRANSFER_START)));
+    ui::Click(ui::Centre(GetDlgItem(dialog, IDC_TRANSFER_START)));
     step = 4;
+    // A download that never ends must fail the road, not hold it: the drop waits on the dialog.
+    if (!ui::WaitFor([&] { return !IsWindow(dialog); }, 60000)) {
+      Say("   the download dialog is still open after a minute: cancelled");
+      step = 5;
+      PostMessageW(dialog, WM_COMMAND, IDCANCEL, 0);
+      // A dialog that cannot even be cancelled holds this thread's drop for good: end here.
+      if (!ui::WaitFor([&] { return !IsWindow(dialog); }, 10000)) {
+        std::printf("FAIL: the download dialog neither ends nor cancels\n");
+        std::fflush(stdout);
+        TerminateProcess(GetCurrentProcess(), 1);
+      }
+    }
   });
 
-  Check(Pump([&] { return step == 1; }), "the sheet came up and was closed with OK");
-  Check(Pump([&] { return RowOf(root, kLevel) > 0; }), "the new level appears in the folder");
+  Check(ui::PumpFor([&] { return step == 1; }), "the sheet came up and was closed with OK");
+  Check(ui::PumpFor([&] { return RowOf(root, kLevel) > 0; }), "the new level appears in the folder");
   Say("3. The new level appears");
-  Pump([] { return false; }, 300 + g_pause);
+  ui::PumpFor([&] { return ui::Painted(frame); });
   Shot(L"level-added");
   step = 2;
-  Check(Pump([&] {
+  Check(ui::PumpFor([&] {
     HWND list = CurrentList(browser);
     return list && list != root && RowOf(list, L"file1.tkf") == 0;
   }), "the level opens and shows file1.tkf");
-  Pump([] { return false; }, 300 + g_pause);
+  ui::PumpFor([&] { return ui::Painted(frame); });
   Shot(L"level-opened");
 
-  std::wstring command = L"\"" + peer + L"\" drop \"" + receiving + L"\" 700 100 60";
-  STARTUPINFOW startup{sizeof(startup)};
-  PROCESS_INFORMATION receiver{};
-  Check(CreateProcessW(nullptr, command.data(), nullptr, nullptr, FALSE, 0, nullptr, nullptr, &startup, &receiver),
-        "the receiving program starts");
-  Pump([] { return FindWindowW(L"MarlixShellPeer", L"Receiver") != nullptr; });
+  child::Process receiver(peer, {L"drop", receiving, L"700", L"100", L"60"});
+  Check(receiver.Started(), "the receiving program starts");
+  ui::PumpFor([] { return FindWindowW(L"MarlixShellPeer", L"Receiver") != nullptr; });
   step = 3;
-  Check(Pump([&] { return WaitForSingleObject(receiver.hProcess, 0) == WAIT_OBJECT_0; }, 90000),
+  Check(ui::PumpFor([&] { return WaitForSingleObject(receiver.Handle(), 0) == WAIT_OBJECT_0; }, 90000),
         "the receiving program took the file and ended");
-  DWORD code = 99;
-  GetExitCodeProcess(receiver.hProcess, &code);
-  CloseHandle(receiver.hProcess);
-  CloseHandle(receiver.hThread);
+  const DWORD code = receiver.ExitCode();
   person.join();
   Check(step == 4, "the download dialog came up and Start was pressed");
   Check(instructions.find(LoadTranslatedString(IDS_INSTRUCTIONS_HRB1X)) != std::wstring::npos,
@@ -273,9 +214,8 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
 int main() {
   int argc = 0;
   wchar_t** argv = CommandLineToArgvW(GetCommandLineW(), &argc);
-  if (argc < 4) return std::printf("usage: download_road <shell_peer> <receiving folder> <shots> [pause ms]\n"), 2;
+  if (argc < 4) return std::printf("usage: download_road <shell_peer> <receiving folder> <shots>\n"), 2;
   g_shots = argv[3];
-  g_pause = argc > 4 ? _wtoi(argv[4]) : 0;
   CreateDirectoryW(argv[2], nullptr);
   CreateDirectoryW(argv[3], nullptr);
   OleInitialize(nullptr);

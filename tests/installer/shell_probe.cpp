@@ -1,3 +1,4 @@
+// Explorer's own shell32 finds the installed folder under My Computer and lists its levels.
 // Asks Wine's shell32, as any client would, for the folder under My Computer. Prints
 //   computer: <name>   for each item of My Computer that is the folder
 //   level: <name>      for each level the folder shows

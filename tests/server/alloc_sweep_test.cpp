@@ -1,6 +1,5 @@
-// Allocation failure swept over what the host calls: for every N, the Nth allocation of
-// the call (operator new or the task allocator) fails; no exception may come out, no
-// block may stay behind, and the module must be free to unload afterwards.
+// Explorer short of memory: whichever allocation fails, no exception, no leak, and the module still unloads.
+// For every N, the Nth allocation of what the host calls (operator new or the task allocator) fails.
 #include <gtest/gtest.h>
 #include <windows.h>
 #include <commctrl.h>
@@ -247,31 +246,22 @@ class Browser : public com::ComObject<IShellBrowser> {
   STDMETHODIMP OnViewWindowActive(IShellView*) override { return S_OK; }
   STDMETHODIMP SetToolbarItems(LPTBBUTTONSB, UINT, UINT) override { return S_OK; }
 };
-// A person dismissing every dialog of this process: Cancel on a sheet, Close on a message
-// box. A thread of the system's, so that it makes no allocation the sweep would count.
-std::atomic<bool> dismissing{false};
-DWORD WINAPI Dismiss(void*) {
-  DWORD process = 0;
-  while (dismissing) {
-    for (HWND dialog = nullptr; (dialog = FindWindowExW(nullptr, dialog, L"#32770", nullptr)) != nullptr;) {
-      if (!IsWindowVisible(dialog) || !GetWindowThreadProcessId(dialog, &process) || process != GetCurrentProcessId())
-        continue;
-      if (PropSheet_GetCurrentPageHwnd(dialog)) PostMessageW(dialog, WM_COMMAND, IDCANCEL, 0);
-      else PostMessageW(dialog, WM_CLOSE, 0, 0);
-    }
-    Sleep(10);
+// A person dismissing each dialog as it comes up: Cancel on a sheet, Close on a message box.
+// The hook runs on the thread that shows it and posts only, so it makes no allocation the sweep counts.
+LRESULT CALLBACK Dismiss(int code, WPARAM wParam, LPARAM lParam) {
+  const auto* call = reinterpret_cast<const CWPRETSTRUCT*>(lParam);
+  if (code == HC_ACTION && call->message == WM_INITDIALOG && !(GetWindowLongW(call->hwnd, GWL_STYLE) & WS_CHILD)) {
+    if (PropSheet_GetCurrentPageHwnd(call->hwnd)) PostMessageW(call->hwnd, WM_COMMAND, IDCANCEL, 0);
+    else PostMessageW(call->hwnd, WM_CLOSE, 0, 0);
   }
-  return 0;
+  return CallNextHookEx(nullptr, code, wParam, lParam);
 }
 // Runs `action`, a modal one, while the person dismisses what it shows.
 template <class Action>
 void Dismissing(Action action) {
-  dismissing = true;
-  HANDLE person = CreateThread(nullptr, 0, Dismiss, nullptr, 0, nullptr);
+  HHOOK person = SetWindowsHookExW(WH_CALLWNDPROCRET, Dismiss, nullptr, GetCurrentThreadId());
   action();
-  dismissing = false;
-  WaitForSingleObject(person, INFINITE);
-  CloseHandle(person);
+  UnhookWindowsHookEx(person);
 }
 // A file's contents: the download dialog comes up and is cancelled before Start.
 void DownloadCancelled() {

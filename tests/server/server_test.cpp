@@ -1,4 +1,6 @@
+// Registration and unregistration leave the registry as Explorer and an uninstaller need it; texts fill in right.
 #include <gtest/gtest.h>
+#include <regex>
 #include <span>
 #include <string>
 #include <vector>
@@ -8,6 +10,7 @@
 #include "base/resource_ids.h"
 #include "marlix_version.h"
 #include "server/server_module.h"
+#include "store/string_table.h"
 #include "support/registry_sandbox.h"
 namespace {
 const HKEY kHKCR = HKEY_CLASSES_ROOT, kHKLM = HKEY_LOCAL_MACHINE;
@@ -59,5 +62,18 @@ TEST_F(ServerModule, UnregisteringRemovesAttributesAfterAFailure) {
   EXPECT_EQ(server_.UnregisterServer(), S_OK);
   EXPECT_TRUE(RegKeyExists(kHKCR, kFolderKey + L"\\ShellFolder"));
   EXPECT_TRUE(ReadAttributes().empty());
+}
+// A text with a placeholder gets from its caller exactly what the placeholder asks for.
+TEST(StringTable, FormatTextsHoldThePlaceholdersTheirCallersFill) {
+  const std::pair<UINT, std::vector<std::wstring>> rows[] = {
+      {IDS_LEVEL_EXISTS, {L"%s"}},  // the sheet puts in the level's name
+  };
+  const std::wregex directive(L"%[-+ #0]*[0-9*]*(\\.[0-9*]+)?[a-zA-Z%]");
+  for (const auto& [id, expected] : rows) {
+    const std::wstring text = LoadTranslatedString(id);
+    std::vector<std::wstring> found;
+    for (std::wsregex_iterator i(text.begin(), text.end(), directive), end; i != end; ++i) found.push_back(i->str());
+    EXPECT_EQ(found, expected) << id;
+  }
 }
 }  // namespace

@@ -1,3 +1,4 @@
+// Scratch registry roots for tests, deleted again when the test ends.
 #include "support/registry_sandbox.h"
 
 #include <atomic>

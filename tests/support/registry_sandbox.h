@@ -1,3 +1,4 @@
+// Each test gets a registry of its own, so a user's levels and registrations are never touched by a run.
 #pragma once
 #include <windows.h>
 #include <string>

@@ -1,3 +1,4 @@
+// Every test program runs its tests on one apartment thread, as Explorer's windows do, and fails if none ran.
 #include <windows.h>
 #include <ole2.h>
 #include <gtest/gtest.h>

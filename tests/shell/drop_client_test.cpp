@@ -107,16 +107,16 @@ class DropOnRootView : public testing::Test {
     POINT to = RowPoint(row);
     std::thread hand([&] {
       // A hand's pace: the drag starts only after a pause and a move of some steps.
-      Mouse(0, {600, 90});
+      ui::Mouse(0, {600, 90});
       Sleep(200);
-      Mouse(MOUSEEVENTF_LEFTDOWN, {600, 90});
+      ui::Mouse(MOUSEEVENTF_LEFTDOWN, {600, 90});
       for (int step = 1; step <= 10; ++step) {
         Sleep(60);
-        Mouse(0, {600 + (to.x - 600) * step / 10, 90 + (to.y - 90) * step / 10});
+        ui::Mouse(0, {600 + (to.x - 600) * step / 10, 90 + (to.y - 90) * step / 10});
       }
       resting = true;
       ui::WaitFor([&] { return release.load(); });
-      Mouse(MOUSEEVENTF_LEFTUP, to);
+      ui::Mouse(MOUSEEVENTF_LEFTUP, to);
     });
     PumpUntil([&] { return resting && Selected() == std::vector<int>{row}; }, 5000);
     seen = Selected();

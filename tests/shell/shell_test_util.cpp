@@ -79,14 +79,6 @@ HWND CurrentList(IExplorerBrowser* browser) {
   return list;
 }
 
-void Mouse(DWORD flags, POINT at) {
-  INPUT input{INPUT_MOUSE};
-  input.mi.dx = at.x * 65535 / (GetSystemMetrics(SM_CXSCREEN) - 1);
-  input.mi.dy = at.y * 65535 / (GetSystemMetrics(SM_CYSCREEN) - 1);
-  input.mi.dwFlags = flags | MOUSEEVENTF_MOVE | MOUSEEVENTF_ABSOLUTE;
-  SendInput(1, &input, sizeof(input));
-}
-
 long KernelHandleCount() {
   using Query = LONG(WINAPI*)(ULONG, void*, ULONG, ULONG*);
   auto query = reinterpret_cast<Query>(

@@ -8,6 +8,7 @@
 #include "base/win_handles.h"
 #include "base/com_base.h"
 #include "store/pidl_manager.h"
+#include "support/window_waits.h"
 
 using UniqueList = win::UniqueCoMem<ITEMIDLIST>;
 using IdList = std::vector<std::pair<tagPIDLTYPE, std::wstring>>;
@@ -33,5 +34,3 @@ HWND CurrentList(IExplorerBrowser* browser);
 // Kernel handles of this process (registry keys among them), from the system's handle list:
 // Wine answers 0 to GetProcessHandleCount.
 long KernelHandleCount();
-// Real mouse input at a screen point, as SendInput gives it.
-void Mouse(DWORD flags, POINT at);

@@ -361,8 +361,8 @@ TEST_F(View, EachMenuOpensWithTheViewsEntriesAndRunsWhatIsChosen) {
     std::thread person([&] {
       RECT box{};
       GetMenuItemRect(browser_->frame, GetMenu(browser_->frame), popup, &box);
-      Mouse(MOUSEEVENTF_LEFTDOWN, {(box.left + box.right) / 2, (box.top + box.bottom) / 2});
-      Mouse(MOUSEEVENTF_LEFTUP, {(box.left + box.right) / 2, (box.top + box.bottom) / 2});
+      ui::Mouse(MOUSEEVENTF_LEFTDOWN, {(box.left + box.right) / 2, (box.top + box.bottom) / 2});
+      ui::Mouse(MOUSEEVENTF_LEFTUP, {(box.left + box.right) / 2, (box.top + box.bottom) / 2});
       HWND opened = nullptr;
       int at = -1;
       ui::WaitFor([&] {
@@ -372,8 +372,8 @@ TEST_F(View, EachMenuOpensWithTheViewsEntriesAndRunsWhatIsChosen) {
           if (GetMenuItemID(menu, i) == id && GetMenuItemRect(nullptr, menu, i, &box)) at = i;
         return at >= 0;
       });
-      if (at >= 0) Mouse(MOUSEEVENTF_LEFTDOWN, {(box.left + box.right) / 2, (box.top + box.bottom) / 2});
-      if (at >= 0) Mouse(MOUSEEVENTF_LEFTUP, {(box.left + box.right) / 2, (box.top + box.bottom) / 2});
+      if (at >= 0) ui::Mouse(MOUSEEVENTF_LEFTDOWN, {(box.left + box.right) / 2, (box.top + box.bottom) / 2});
+      if (at >= 0) ui::Mouse(MOUSEEVENTF_LEFTUP, {(box.left + box.right) / 2, (box.top + box.bottom) / 2});
       else PostMessageW(browser_->frame, WM_CANCELMODE, 0, 0);  // a menu left open by a failed choice
       done = true;
     });

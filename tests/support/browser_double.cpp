@@ -57,7 +57,6 @@ LRESULT CALLBACK BrowserDouble::FrameProc(HWND window, UINT message, WPARAM wPar
     return SendMessageW(self->active_, message, wParam, lParam);
   if (message == WM_COMMAND) self->commands.push_back(wParam);
   if (message == WM_COMMAND && wParam == kCmdBrowserRefresh) ++self->reloads;
-  if (message == kReloadsAsked) return self->reloads;
   return DefWindowProcW(window, message, wParam, lParam);
 }
 

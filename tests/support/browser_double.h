@@ -14,12 +14,11 @@ std::vector<std::wstring> MenuEntries(HMENU menu);
 
 // What Explorer's window is to its view: it lends File, Edit and View popups to merge into,
 // shows the bar the view sets and hands that bar's popups and the view's commands to the
-// view, and keeps the view state stream. It records what the view tells it. Its frame is a hidden top-level window of class kClass,
-// which another process finds by its title and may ask kReloadsAsked.
+// view, and keeps the view state stream. It records what the view tells it. Its frame is a
+// hidden top-level window of class kClass, which another process finds by its title.
 class BrowserDouble : public com::ComObject<IShellBrowser> {
  public:
   static constexpr const wchar_t* kClass = L"BrowserDoubleFrame";
-  static constexpr UINT kReloadsAsked = WM_APP;  // answered with `reloads`
 
   BrowserDouble();
   ~BrowserDouble() override { DestroyWindow(frame); }

@@ -8,14 +8,12 @@
 #include <atomic>
 #include <filesystem>
 #include <fstream>
-#include <functional>
 #include <sstream>
 #include <thread>
 
 #include "config/sheet_driver.h"
 #include "shell/shell_test_util.h"
 #include "store/station_record.h"
-#include "support/registry_sandbox.h"
 
 namespace {
 

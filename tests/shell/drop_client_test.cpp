@@ -8,14 +8,12 @@
 #include <atomic>
 #include <filesystem>
 #include <fstream>
-#include <functional>
 #include <sstream>
 #include <thread>
 
 #include "config/sheet_driver.h"
 #include "shell/shell_test_util.h"
 #include "store/station_record.h"
-#include "support/registry_sandbox.h"
 
 namespace {
 
@@ -180,7 +178,6 @@ TEST_F(DropOnRootView, TheRegisteredTargetRefusesTheAddRowEmptySpaceAndAGoneView
   EXPECT_EQ(target_->DragOver(0, {level.x, level.y}, nullptr), S_OK) << "no effect pointer";
   EXPECT_EQ(target_->DragOver(0, {level.x, level.y}, &effect), S_OK);
   EXPECT_EQ(effect, DWORD(DROPEFFECT_COPY)) << "copy, though the source allowed nothing";
-  EXPECT_EQ(target_->Drop(data.Get(), 0, {level.x, level.y}, &effect), E_INVALIDARG) << "the level refuses";
   target_->AddRef();  // as a drag in progress holds it
   browser_->Destroy();
   browser_.Reset();

@@ -30,11 +30,6 @@ std::vector<UniqueList> Drain(IEnumIDList* list) {
   EXPECT_EQ(fetched, 0u);
   return items;
 }
-std::vector<UniqueList> Enum(IShellFolder* folder, SHCONTF flags) {
-  com::ComPtr<IEnumIDList> list;
-  EXPECT_EQ(folder->EnumObjects(nullptr, flags, list.Put()), S_OK);
-  return Drain(list.Get());
-}
 com::ComPtr<IShellFolder> Bind(IShellFolder* parent, LPCITEMIDLIST item) {
   com::ComPtr<IShellFolder> child;
   EXPECT_EQ(parent->BindToObject(item, nullptr, IID_IShellFolder, child.PutVoid()), S_OK);
@@ -77,6 +72,17 @@ HWND CurrentList(IExplorerBrowser* browser) {
   HWND list = GetDlgItem(window, 2000);
   EXPECT_TRUE(PumpUntil([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); })) << "filled";
   return list;
+}
+
+std::vector<std::wstring> ListRows(HWND list, bool images) {
+  std::vector<std::wstring> rows;
+  for (int i = 0; i < ListView_GetItemCount(list); ++i) {
+    wchar_t text[MAX_PATH] = {};
+    LVITEMW item{LVIF_IMAGE, i, 0, 0, 0, text, MAX_PATH};
+    SendMessageW(list, images ? LVM_GETITEMW : LVM_GETITEMTEXTW, i, reinterpret_cast<LPARAM>(&item));
+    rows.push_back(images ? std::to_wstring(item.iImage) : text);
+  }
+  return rows;
 }
 
 long KernelHandleCount() {

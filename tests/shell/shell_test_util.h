@@ -21,7 +21,6 @@ UniqueList MakeFull(const wchar_t* path);  // e.g. L"Marlix Digital Levels\\Alph
 void SeedLevel(int n, const std::wstring& name);  // a level key "Station <n>" with a "Name" in the user's store
 IdList Ids(LPCITEMIDLIST list);  // type and text of every id
 std::vector<UniqueList> Drain(IEnumIDList* list);  // checks the last Next reports none fetched
-std::vector<UniqueList> Enum(IShellFolder* folder, SHCONTF flags);
 com::ComPtr<IShellFolder> Bind(IShellFolder* parent, LPCITEMIDLIST item);
 // A display name, which must come as a wide string; "<failed>" if the call fails.
 std::wstring Name(IShellFolder* folder, LPCITEMIDLIST item, SHGDNF flags, HRESULT* hr = nullptr);
@@ -34,3 +33,5 @@ HWND CurrentList(IExplorerBrowser* browser);
 // Kernel handles of this process (registry keys among them), from the system's handle list:
 // Wine answers 0 to GetProcessHandleCount.
 long KernelHandleCount();
+// The text, or with `images` the picture index, of every row of a list view.
+std::vector<std::wstring> ListRows(HWND list, bool images = false);

@@ -40,7 +40,7 @@ std::vector<std::wstring> MenuEntries(HMENU menu) {
   return entries;
 }
 
-BrowserDouble::BrowserDouble(bool dialog) : dialog_(dialog) {
+BrowserDouble::BrowserDouble() {
   WNDCLASSW wc{0, FrameProc, 0, 0, GetModuleHandleW(nullptr), nullptr, nullptr, nullptr, nullptr, kClass};
   RegisterClassW(&wc);
   frame = CreateWindowExW(0, kClass, nullptr, WS_OVERLAPPEDWINDOW, 0, 0, 600, 400, nullptr, nullptr,
@@ -57,7 +57,6 @@ LRESULT CALLBACK BrowserDouble::FrameProc(HWND window, UINT message, WPARAM wPar
     return SendMessageW(self->active_, message, wParam, lParam);
   if (message == WM_COMMAND) self->commands.push_back(wParam);
   if (message == WM_COMMAND && wParam == kCmdBrowserRefresh) ++self->reloads;
-  if (message == kReloadsAsked) return self->reloads;
   return DefWindowProcW(window, message, wParam, lParam);
 }
 

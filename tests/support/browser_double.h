@@ -14,15 +14,13 @@ std::vector<std::wstring> MenuEntries(HMENU menu);
 
 // What Explorer's window is to its view: it lends File, Edit and View popups to merge into,
 // shows the bar the view sets and hands that bar's popups and the view's commands to the
-// view, keeps the view state stream, and as a file dialog (`dialog`) answers ICommDlgBrowser.
-// It records what the view tells it. Its frame is a hidden top-level window of class kClass,
-// which another process finds by its title and may ask kReloadsAsked.
-class BrowserDouble : public com::ComObject<IShellBrowser, ICommDlgBrowser> {
+// view, and keeps the view state stream. It records what the view tells it. Its frame is a
+// hidden top-level window of class kClass, which another process finds by its title.
+class BrowserDouble : public com::ComObject<IShellBrowser> {
  public:
   static constexpr const wchar_t* kClass = L"BrowserDoubleFrame";
-  static constexpr UINT kReloadsAsked = WM_APP;  // answered with `reloads`
 
-  explicit BrowserDouble(bool dialog = false);
+  BrowserDouble();
   ~BrowserDouble() override { DestroyWindow(frame); }
 
   HWND frame = nullptr;
@@ -53,17 +51,8 @@ class BrowserDouble : public com::ComObject<IShellBrowser, ICommDlgBrowser> {
   STDMETHODIMP QueryActiveShellView(IShellView** view) noexcept override { return *view = nullptr, E_NOTIMPL; }
   STDMETHODIMP OnViewWindowActive(IShellView*) noexcept override { return S_OK; }
   STDMETHODIMP SetToolbarItems(LPTBBUTTONSB, UINT, UINT) noexcept override { return S_OK; }
-  STDMETHODIMP OnDefaultCommand(IShellView*) noexcept override { return S_OK; }
-  STDMETHODIMP OnStateChange(IShellView*, ULONG) noexcept override { return S_OK; }
-  STDMETHODIMP IncludeObject(IShellView*, PCUITEMID_CHILD) noexcept override { return S_OK; }
-
- protected:
-  void* FindInterface(REFIID riid) noexcept override {
-    return riid == IID_ICommDlgBrowser && !dialog_ ? nullptr : ComObject::FindInterface(riid);
-  }
 
  private:
   static LRESULT CALLBACK FrameProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
-  bool dialog_;
   HWND active_ = nullptr;  // the view window the shown bar belongs to
 };

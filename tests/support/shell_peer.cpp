@@ -1,13 +1,11 @@
 // Another program a person uses beside Explorer: a folder window taking dropped or pasted files, or a drag source.
-//   shell_peer drop <folder> <x> <y> <seconds>   a window at (x, y), 200x150, that takes one drop
+//   shell_peer drop <folder> <x> <y> <seconds>   a 200x150 window at (x, y) that takes one drop
 //   shell_peer paste <folder>                     what the clipboard holds, at once
-// As a receiver it reads "FileGroupDescriptorW", then "FileContents" for each index, writes each
-// stream into <folder> under its name and prints "received <name> <bytes>" or a failure; it exits
-// 0 only if every file was written, 2 if nothing was dropped in time.
+// A receiver writes each "FileContents" stream into <folder> under its descriptor's name, prints
+// "received <name> <bytes>" or a failure, and exits 0 only if every file was written (2: no drop in time).
 //   shell_peer drag <x> <y> <seconds> <parsing name>...
-// The shell's own data object of the items, dragged from a window at (x, y) once the left button
-// is pressed on it. Prints "effects <every effect the target answered, as a bit set>" and
-// "result <DoDragDrop's result> <effect>"; exits 0 if the drag ran.
+// Drags the shell's data object of the items once the left button is pressed on its window; prints
+// "effects <bit set of every effect the target answered>" and "result <hr> <effect>".
 #include <windows.h>
 #include <ole2.h>
 #include <shlobj.h>
@@ -24,16 +22,11 @@ int g_result = 2;
 bool WriteStream(IStream* stream, const std::wstring& path, size_t& total) {
   HANDLE file = CreateFileW(path.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, FILE_ATTRIBUTE_NORMAL, nullptr);
   if (file == INVALID_HANDLE_VALUE) return false;
-  std::vector<char> buffer(4096);
+  char buffer[4096];
   bool ok = true;
-  for (;;) {
-    ULONG got = 0;
-    HRESULT hr = stream->Read(buffer.data(), ULONG(buffer.size()), &got);
-    DWORD written = 0;
-    if (got && !WriteFile(file, buffer.data(), got, &written, nullptr)) ok = false;
-    total += got;
-    if (FAILED(hr) || got < buffer.size()) break;
-  }
+  ULONG got = sizeof(buffer);
+  for (DWORD written = 0; got == sizeof(buffer) && SUCCEEDED(stream->Read(buffer, sizeof(buffer), &got)); total += got)
+    ok = ok && WriteFile(file, buffer, got, &written, nullptr);
   CloseHandle(file);
   return ok;
 }

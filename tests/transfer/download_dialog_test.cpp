@@ -77,24 +77,6 @@ TEST(CommInterface, CallbackPostsTheCodeToTheOpenDialogOnly) {
   DownloadDialogWindow = nullptr;
 }
 
-// The stand-in honours the contract the dialog relies on: every started transfer calls back.
-HANDLE calledBack = CreateSemaphoreW(nullptr, 0, 2, nullptr);
-TEST(StandIn, EveryReceiveFileCallsBack) {
-  ConfigureStandIn("delay_ms=50\n");
-  std::wstring error;
-  IMarlixComm* comm = CreateCommObject(error);
-  ASSERT_TRUE(comm) << testing::PrintToString(error);
-  comm->SetCallback([](int) { ReleaseSemaphore(calledBack, 1, nullptr); });
-  const std::string target = (fs::temp_directory_path() / "TKFstandin").string();
-  comm->SetFilePath(target.c_str());
-  EXPECT_EQ(comm->ReceiveFile(20, true), 0);
-  EXPECT_EQ(comm->ReceiveFile(20, true), 0);
-  EXPECT_EQ(WaitForSingleObject(calledBack, 5000), WAIT_OBJECT_0);
-  EXPECT_EQ(WaitForSingleObject(calledBack, 5000), WAIT_OBJECT_0);
-  comm->Destroy(1);
-  fs::remove(target + ".txt");
-}
-
 // Both transfer dialogs as the dialog manager makes them from the module: what their user sees.
 TEST(TransferDialogs, CaptionControlsAndLayoutAsShown) {
   auto make = [](WORD id) {
@@ -133,31 +115,6 @@ TEST(TransferDialogs, CaptionControlsAndLayoutAsShown) {
   const int box = IDC_TRANSFER_INSTRUCTIONS;
   EXPECT_EQ(heightOf(GetDlgItem(dialogs[1].first, box)), heightOf(GetDlgItem(dialogs[0].first, box)) - up.bottom);
   for (const auto& dialog : dialogs) DestroyWindow(dialog.first);
-}
-
-// The hidden window hands its view the change notification only, and lets go of its pair before
-// it is destroyed, so it never reaches a pair already freed.
-TEST(ViewNotify, TheHiddenWindowPassesOnlyItsMessageAndLetsGoOfItsPairFirst) {
-  static HWND view = CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, nullptr, nullptr);
-  static std::vector<UINT> reachedView;
-  static LONG_PTR pairAtDestroy = -1;
-  NotifyWindowPair pair;
-  ASSERT_EQ(CreateNotifyWindow(pair, view), S_OK);
-  HHOOK hook = SetWindowsHookExW(WH_CALLWNDPROC, [](int code, WPARAM w, LPARAM l) -> LRESULT {
-    auto* call = reinterpret_cast<CWPSTRUCT*>(l);
-    if (call->hwnd == view && (call->message == GlobalNotifyMessage || call->message == DownloadMessage))
-      reachedView.push_back(call->message);
-    if (call->message == WM_DESTROY && call->hwnd != view) pairAtDestroy = GetWindowLongPtrW(call->hwnd, GWLP_USERDATA);
-    return CallNextHookEx(nullptr, code, w, l);
-  }, nullptr, GetCurrentThreadId());
-  SendMessageW(pair.Hidden, DownloadMessage, 1, 1);
-  SendMessageW(pair.Hidden, GlobalNotifyMessage, 1, 2);
-  EXPECT_EQ(reachedView, std::vector<UINT>{GlobalNotifyMessage});
-  DestroyNotifyWindow(pair);
-  UnhookWindowsHookEx(hook);
-  EXPECT_EQ(pairAtDestroy, 0);
-  DestroyNotifyWindow(pair);  // a second time is harmless
-  DestroyWindow(view);
 }
 
 // Puts the block's free into the stand-in's log, so its order against Destroy shows.

@@ -64,6 +64,15 @@ TEST_F(DataObject, RequestsThatNeedNoTransfer) {
       FORMATETC f = Request(row.format, row.tymed, 0);
       EXPECT_EQ(two->QueryGetData(&f), row.query) << row.format << ", tymed " << row.tymed;
     }
+    // What a program that lists the formats before it asks (the clipboard's paste command) sees.
+    com::ComPtr<IEnumFORMATETC> list;
+    EXPECT_EQ(two->EnumFormatEtc(DATADIR_GET, list.Put()), S_OK);
+    FORMATETC got[10]{};
+    ULONG n = 0;
+    EXPECT_EQ(list->Next(10, got, &n), S_OK) << "fewer than asked is still S_OK";
+    EXPECT_EQ(n, 4u);
+    for (ULONG i = 0; i < n; ++i)
+      EXPECT_TRUE(got[i].cfFormat == Request(rows[i].format, 0).cfFormat && got[i].tymed == rows[i].tymed) << i;
     EXPECT_EQ(Fetch(two.Get(), L"Preferred DropEffect"), (std::vector<BYTE>{DROPEFFECT_COPY, 0, 0, 0}));
     // The parent of the first item, then the last id of each, at the offsets of the table.
     const std::vector<BYTE> parent = IdList({{1, L"Marlix Digital Levels"}, {2, L"North"}}),

@@ -27,21 +27,8 @@ inline HWND Page(HWND sheet, int index) {
 inline void ShowTab(HWND sheet, int index) { SendMessageW(sheet, PSM_SETCURSEL, static_cast<WPARAM>(index), 0); }
 inline void Press(HWND sheet, int id) { user::Click(sheet, id); }
 inline bool ApplyEnabled(HWND sheet) { return IsWindowEnabled(GetDlgItem(sheet, 12321)) != FALSE; }
-inline std::wstring TabText(HWND sheet, int index) {
-  wchar_t text[64] = {};
-  TCITEMW item{.mask = TCIF_TEXT, .pszText = text, .cchTextMax = 64};
-  SendMessageW(reinterpret_cast<HWND>(SendMessageW(sheet, PSM_GETTABCONTROL, 0, 0)), TCM_GETITEMW, index,
-               reinterpret_cast<LPARAM>(&item));
-  return text;
-}
-
-// Replaces the edit's text key by key; an empty text is a backspace over everything.
-inline void Type(HWND page, int id, const std::wstring& text) {
-  HWND edit = GetDlgItem(page, id);
-  SendMessageW(edit, EM_SETSEL, 0, -1);
-  if (text.empty()) SendMessageW(edit, WM_CHAR, VK_BACK, 0);
-  for (wchar_t c : text) SendMessageW(edit, WM_CHAR, c, 0);
-}
+// Replaces the edit's text key by key; L"\b" is a backspace over all it held.
+inline void Type(HWND page, int id, const std::wstring& text) { ui::Type(GetDlgItem(page, id), text.c_str()); }
 
 inline std::wstring Entry(HWND combo, LRESULT at) {
   wchar_t text[256] = {};
@@ -98,62 +85,6 @@ inline void SetSerialPorts(const std::vector<std::pair<std::wstring, std::wstrin
   const std::wstring path = L"HARDWARE\\DEVICEMAP\\SERIALCOMM";
   RegDeleteTreeW(HKEY_LOCAL_MACHINE, path.c_str());
   for (const auto& [name, port] : ports) RegWriteString(HKEY_LOCAL_MACHINE, path, name.c_str(), port);
-}
-
-// Whether `window` and every window in it have painted what they show.
-inline bool Painted(HWND window) {
-  BOOL painted = !GetUpdateRect(window, nullptr, FALSE);
-  EnumChildWindows(window, [](HWND child, LPARAM all) {
-    if (GetUpdateRect(child, nullptr, FALSE)) *reinterpret_cast<BOOL*>(all) = FALSE;
-    return TRUE;
-  }, reinterpret_cast<LPARAM>(&painted));
-  return painted != FALSE;
-}
-
-// Saves what the screen shows of `window`, once painted, as a 24-bit BMP (for the pictures in docs/).
-inline bool SaveScreenshot(HWND window, const std::wstring& path) {
-  if (!WaitFor([&] { return Painted(window); })) return false;
-  RECT r{};
-  GetWindowRect(window, &r);
-  const int width = r.right - r.left, height = r.bottom - r.top, stride = (width * 3 + 3) & ~3;
-  BITMAPINFOHEADER info{sizeof info, width, height, 1, 24, BI_RGB};
-  std::vector<BYTE> pixels(static_cast<size_t>(stride) * height);
-  HDC screen = GetDC(nullptr), memory = CreateCompatibleDC(screen);
-  HBITMAP bitmap = CreateCompatibleBitmap(screen, width, height);
-  HGDIOBJ old = SelectObject(memory, bitmap);
-  BitBlt(memory, 0, 0, width, height, screen, r.left, r.top, SRCCOPY);
-  SelectObject(memory, old);
-  GetDIBits(memory, bitmap, 0, height, pixels.data(), reinterpret_cast<BITMAPINFO*>(&info), DIB_RGB_COLORS);
-  DeleteObject(bitmap);
-  DeleteDC(memory);
-  ReleaseDC(nullptr, screen);
-  BITMAPFILEHEADER file{0x4D42, DWORD(sizeof file + sizeof info + pixels.size()), 0, 0, sizeof file + sizeof info};
-  HANDLE out = CreateFileW(path.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, 0, nullptr);
-  if (out == INVALID_HANDLE_VALUE) return false;
-  DWORD written = 0;
-  bool ok = WriteFile(out, &file, sizeof file, &written, nullptr) && WriteFile(out, &info, sizeof info, &written, nullptr) &&
-            WriteFile(out, pixels.data(), DWORD(pixels.size()), &written, nullptr);
-  CloseHandle(out);
-  return ok;
-}
-
-// Pictures of both pages of a sheet over a sample level, into the folder named by
-// MARLIX_SCREENSHOTS, as <prefix>-general.bmp and <prefix>-advanced.bmp.
-inline void TakeScreenshots(const std::wstring& prefix) {
-  wchar_t folder[MAX_PATH] = {};
-  if (!GetEnvironmentVariableW(L"MARLIX_SCREENSHOTS", folder, MAX_PATH)) GTEST_SKIP() << "MARLIX_SCREENSHOTS not set";
-  SetSerialPorts({{L"\\Device\\Serial0", L"COM1"}, {L"\\Device\\Serial1", L"COM3"}});
-  CStationRecord level;
-  level.Name = L"North benchmark line", level.Manufacturer = L"Tripod 4, spare battery", level.Port = 3;
-  level.Parity = 1, level.BaudRate = 19200;
-  ASSERT_EQ(AddStation(level), S_OK);
-  RunSheet(level, false, [&](HWND window) {
-    SetWindowPos(window, HWND_TOP, 20, 20, 0, 0, SWP_NOSIZE);
-    EXPECT_TRUE(SaveScreenshot(window, std::wstring(folder) + L"\\" + prefix + L"-general.bmp"));
-    ShowTab(window, 1);
-    EXPECT_TRUE(SaveScreenshot(window, std::wstring(folder) + L"\\" + prefix + L"-advanced.bmp"));
-    Press(window, IDCANCEL);
-  });
 }
 
 }  // namespace sheet

@@ -12,14 +12,6 @@
 
 namespace user {
 
-// Waits up to `limitMs` for `condition`, or until `stop` is set; whether the condition holds.
-template <class Condition>
-bool WaitUntil(Condition condition, DWORD limitMs, const std::atomic<bool>& stop) {
-  for (ULONGLONG end = GetTickCount64() + limitMs; !condition(); Sleep(20))
-    if (stop || GetTickCount64() > end) return condition();
-  return true;
-}
-
 // A user's click: only on a control that shows and is enabled, and posted, so the user never
 // waits for what it sets off.
 inline void Click(HWND dialog, int id) {
@@ -45,7 +37,7 @@ inline INT_PTR RunModal(const std::function<INT_PTR()>& modal, const std::functi
   std::atomic<bool> done{false};
   std::thread second([&] {
     HWND window = nullptr;
-    if (!WaitUntil([&] { return (window = ui::OwnedDialog(owner)) != nullptr; }, limitMs, done)) {
+    if (!ui::WaitFor([&] { return done || (window = ui::OwnedDialog(owner)) != nullptr; }, limitMs) || !window) {
       if (act) ADD_FAILURE() << "no dialog came up";
       return;
     }

@@ -1,5 +1,4 @@
-# The instrument side of transfer: the library contract, the stand-in, the download
-# dialog and the change notification among views.
+# The instrument side of transfer: the library contract and the download dialog.
 marlix_test(comm_tests SOURCES
   ${CMAKE_CURRENT_SOURCE_DIR}/download_dialog_test.cpp)
 # A folder of its own: the stand-in's control file and log live beside the program.

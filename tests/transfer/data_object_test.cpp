@@ -2,6 +2,8 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <filesystem>
+#include <fstream>
 #include <map>
 
 #include "data_test_support.h"
@@ -9,6 +11,7 @@
 #include "base/win_handles.h"
 #include "shell/shell_folder.h"
 #include "store/station_record.h"
+#include "support/child_process.h"
 #include "support/modal_user.h"
 #include "support/registry_sandbox.h"
 #include "transfer/data_object.h"
@@ -61,6 +64,7 @@ TEST_F(DataObject, RequestsThatNeedNoTransfer) {
       FORMATETC f = Request(row.format, row.tymed, 0);
       EXPECT_EQ(two->QueryGetData(&f), row.query) << row.format << ", tymed " << row.tymed;
     }
+    // What a program that lists the formats before it asks (the clipboard's paste command) sees.
     com::ComPtr<IEnumFORMATETC> list;
     EXPECT_EQ(two->EnumFormatEtc(DATADIR_GET, list.Put()), S_OK);
     FORMATETC got[10]{};
@@ -69,7 +73,6 @@ TEST_F(DataObject, RequestsThatNeedNoTransfer) {
     EXPECT_EQ(n, 4u);
     for (ULONG i = 0; i < n; ++i)
       EXPECT_TRUE(got[i].cfFormat == Request(rows[i].format, 0).cfFormat && got[i].tymed == rows[i].tymed) << i;
-
     EXPECT_EQ(Fetch(two.Get(), L"Preferred DropEffect"), (std::vector<BYTE>{DROPEFFECT_COPY, 0, 0, 0}));
     // The parent of the first item, then the last id of each, at the offsets of the table.
     const std::vector<BYTE> parent = IdList({{1, L"Marlix Digital Levels"}, {2, L"North"}}),
@@ -123,6 +126,31 @@ TEST_F(DataObject, EachContentsRequestIsATransferOfItsOwn) {
     EXPECT_EQ(user::RunModal(get, [](HWND dialog) { user::Click(dialog, IDCANCEL); }), S_FALSE) << index;
     EXPECT_EQ(m_.tymed, 0x77u);
   }
+}
+
+// Copied at the longest name a level can have, the clipboard holding the only reference, the file
+// pastes whole in another process, as Explorer pastes it, and leaves no temporary file behind.
+TEST_F(DataObject, ACopiedFilePastesWholeInAnotherProcess) {
+  const std::wstring name(kMaxStationNameLength, L'c');
+  ASSERT_EQ(OleSetClipboard(Make({name.c_str()}, {{name.c_str(), true}}).Get()), S_OK);
+  const auto before = TransferFiles();
+  const std::wstring folder = TempDir() + L"pasted";
+  CreateDirectoryW(folder.c_str(), nullptr);
+  wchar_t peer[MAX_PATH] = {};
+  ASSERT_TRUE(GetEnvironmentVariableW(L"MARLIX_SHELL_PEER", peer, MAX_PATH));
+  child::Process receiver(peer, {L"paste", folder});
+  HANDLE ended = receiver.Handle();
+  ASSERT_TRUE(ended);
+  const DWORD serve = COWAIT_DISPATCH_WINDOW_MESSAGES | COWAIT_DISPATCH_CALLS;
+  EXPECT_EQ(user::RunModal([&] {  // the apartment serves the receiver's calls until it ends
+    DWORD index;
+    return INT_PTR(CoWaitForMultipleHandles(serve, 60000, 1, &ended, &index));
+  }, [](HWND dialog) { user::Click(dialog, IDC_TRANSFER_START); }, nullptr, 60000), S_OK);
+  OleSetClipboard(nullptr);
+  EXPECT_EQ(receiver.ExitCode(), 0u);
+  EXPECT_EQ(TransferFiles(), before) << "the received .txt is gone";
+  std::ifstream pasted(std::filesystem::path(folder + L"\\file1.tkf"), std::ios::binary);
+  EXPECT_TRUE(IsStandInJob({std::istreambuf_iterator<char>(pasted), {}}));
 }
 
 TEST_F(DataObject, DragPictureIsCleanedOnlyWhenNothingIsHeld) {

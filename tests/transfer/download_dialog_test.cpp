@@ -7,6 +7,7 @@
 #include <fstream>
 #include <memory>
 
+#include "helpers/app_helpers.h"
 #include "helpers/error_reporter.h"
 #include "base/resource_ids.h"
 #include "store/string_table.h"
@@ -22,12 +23,7 @@ using ui::Text;
 using ui::WaitFor;
 using user::Click;
 
-fs::path Self() {
-  wchar_t self[MAX_PATH] = {};
-  GetModuleFileNameW(nullptr, self, MAX_PATH);
-  return self;
-}
-fs::path Beside(const wchar_t* name) { return Self().replace_filename(name); }
+fs::path Beside(const wchar_t* name) { return kld::ft::GetAppPathW() + name; }
 // The stand-in library beside this program reads its settings from MarlixComm.txt and logs its calls.
 void ConfigureStandIn(const std::string& settings) {  // and empties the log
   std::ofstream(Beside(L"MarlixComm.txt"), std::ios::binary) << settings;
@@ -77,87 +73,37 @@ TEST(CommInterface, CallbackPostsTheCodeToTheOpenDialogOnly) {
   DownloadDialogWindow = nullptr;
 }
 
-// The stand-in honours the contract the dialog relies on: every started transfer calls back.
-HANDLE calledBack = CreateSemaphoreW(nullptr, 0, 2, nullptr);
-TEST(StandIn, EveryReceiveFileCallsBack) {
-  ConfigureStandIn("delay_ms=50\n");
-  std::wstring error;
-  IMarlixComm* comm = CreateCommObject(error);
-  ASSERT_TRUE(comm) << testing::PrintToString(error);
-  comm->SetCallback([](int) { ReleaseSemaphore(calledBack, 1, nullptr); });
-  const std::string target = (fs::temp_directory_path() / "TKFstandin").string();
-  comm->SetFilePath(target.c_str());
-  EXPECT_EQ(comm->ReceiveFile(20, true), 0);
-  EXPECT_EQ(comm->ReceiveFile(20, true), 0);
-  EXPECT_EQ(WaitForSingleObject(calledBack, 5000), WAIT_OBJECT_0);
-  EXPECT_EQ(WaitForSingleObject(calledBack, 5000), WAIT_OBJECT_0);
-  comm->Destroy(1);
-  fs::remove(target + ".txt");
+int HeightOf(HWND window) {
+  RECT r{};
+  GetWindowRect(window, &r);
+  return r.bottom - r.top;
 }
 
-// Both transfer dialogs as the dialog manager makes them from the module: what their user sees.
-TEST(TransferDialogs, CaptionControlsAndLayoutAsShown) {
-  auto make = [](WORD id) {
-    return CreateDialogParamW(GetModuleHandleW(nullptr), MAKEINTRESOURCEW(id), nullptr,
-                              [](HWND, UINT, WPARAM, LPARAM) -> INT_PTR { return FALSE; }, 0);
-  };
-  const auto heightOf = [](HWND window) {
-    RECT r{};
-    GetWindowRect(window, &r);
-    return r.bottom - r.top;
-  };
-  const std::pair<HWND, std::wstring> dialogs[] = {{make(213), L"Download file from Digital Level"},
-                                                   {make(216), L"Upload file(s) to Digital Level"}};
-  for (const auto& [dialog, caption] : dialogs) {
-    ASSERT_TRUE(dialog);
-    EXPECT_EQ(Text(dialog), caption);
-    const std::pair<int, std::wstring> controls[] = {
-        {IDCANCEL, L"Cancel"},
-        {IDC_TRANSFER_START, L"Start"},
-        {IDC_TRANSFER_STATUS_LABEL, L"Status:"},
-        {IDC_TRANSFER_STATUS, L"Status text"},
-        {IDC_TRANSFER_NAME_LABEL, L"File name:"},
-        {IDC_TRANSFER_NAME, L"Name"},
-        {IDC_TRANSFER_INSTRUCTIONS, L""}};
-    for (const auto& [id, text] : controls) {
-      EXPECT_TRUE(GetWindowLongW(GetDlgItem(dialog, id), GWL_STYLE) & WS_VISIBLE) << caption << ", control " << id;
-      EXPECT_EQ(Text(dialog, id), text) << caption << ", control " << id;
-    }
-    const DWORD readOnlyText = ES_READONLY | ES_MULTILINE | WS_VSCROLL;
-    EXPECT_EQ(GetWindowLongW(GetDlgItem(dialog, IDC_TRANSFER_INSTRUCTIONS), GWL_STYLE) & readOnlyText, readOnlyText);
+// Both transfer dialogs as the dialog manager makes them from the module: what their user reads.
+// The upload twin is the download's with the text box, and all below it, 32 dialog units higher.
+TEST(TransferDialogs, CaptionLabelsAndLayoutAsShown) {
+  HWND dialogs[2] = {};
+  const std::pair<WORD, std::wstring> templates[] = {{213, L"Download file from Digital Level"},
+                                                     {216, L"Upload file(s) to Digital Level"}};
+  for (int i = 0; i < 2; ++i) {
+    const auto& [id, caption] = templates[i];
+    dialogs[i] = CreateDialogParamW(GetModuleHandleW(nullptr), MAKEINTRESOURCEW(id), nullptr,
+                                    [](HWND, UINT, WPARAM, LPARAM) -> INT_PTR { return FALSE; }, 0);
+    ASSERT_TRUE(dialogs[i]);
+    EXPECT_EQ(Text(dialogs[i]), caption);
+    EXPECT_EQ(Text(dialogs[i], IDCANCEL), L"Cancel") << caption;
+    EXPECT_EQ(Text(dialogs[i], IDC_TRANSFER_START), L"Start") << caption;
+    EXPECT_EQ(Text(dialogs[i], IDC_TRANSFER_STATUS_LABEL), L"Status:") << caption;
+    EXPECT_EQ(Text(dialogs[i], IDC_TRANSFER_NAME_LABEL), L"File name:") << caption;
+    const LONG readOnlyText = ES_READONLY | ES_MULTILINE | WS_VSCROLL;
+    EXPECT_EQ(GetWindowLongW(GetDlgItem(dialogs[i], IDC_TRANSFER_INSTRUCTIONS), GWL_STYLE) & readOnlyText, readOnlyText);
   }
-  // The upload twin is the download's with the text box, and all below it, 32 dialog units higher.
   RECT up{0, 0, 0, 32};
-  MapDialogRect(dialogs[0].first, &up);
-  EXPECT_EQ(heightOf(dialogs[1].first), heightOf(dialogs[0].first) - up.bottom);
+  MapDialogRect(dialogs[0], &up);
+  EXPECT_EQ(HeightOf(dialogs[1]), HeightOf(dialogs[0]) - up.bottom);
   const int box = IDC_TRANSFER_INSTRUCTIONS;
-  EXPECT_EQ(heightOf(GetDlgItem(dialogs[1].first, box)), heightOf(GetDlgItem(dialogs[0].first, box)) - up.bottom);
-  for (const auto& dialog : dialogs) DestroyWindow(dialog.first);
-}
-
-// The hidden window hands its view the change notification only, and lets go of its pair before
-// it is destroyed, so it never reaches a pair already freed.
-TEST(ViewNotify, TheHiddenWindowPassesOnlyItsMessageAndLetsGoOfItsPairFirst) {
-  static HWND view = CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, nullptr, nullptr);
-  static std::vector<UINT> reachedView;
-  static LONG_PTR pairAtDestroy = -1;
-  NotifyWindowPair pair;
-  ASSERT_EQ(CreateNotifyWindow(pair, view), S_OK);
-  HHOOK hook = SetWindowsHookExW(WH_CALLWNDPROC, [](int code, WPARAM w, LPARAM l) -> LRESULT {
-    auto* call = reinterpret_cast<CWPSTRUCT*>(l);
-    if (call->hwnd == view && (call->message == GlobalNotifyMessage || call->message == DownloadMessage))
-      reachedView.push_back(call->message);
-    if (call->message == WM_DESTROY && call->hwnd != view) pairAtDestroy = GetWindowLongPtrW(call->hwnd, GWLP_USERDATA);
-    return CallNextHookEx(nullptr, code, w, l);
-  }, nullptr, GetCurrentThreadId());
-  SendMessageW(pair.Hidden, DownloadMessage, 1, 1);
-  SendMessageW(pair.Hidden, GlobalNotifyMessage, 1, 2);
-  EXPECT_EQ(reachedView, std::vector<UINT>{GlobalNotifyMessage});
-  DestroyNotifyWindow(pair);
-  UnhookWindowsHookEx(hook);
-  EXPECT_EQ(pairAtDestroy, 0);
-  DestroyNotifyWindow(pair);  // a second time is harmless
-  DestroyWindow(view);
+  EXPECT_EQ(HeightOf(GetDlgItem(dialogs[1], box)), HeightOf(GetDlgItem(dialogs[0], box)) - up.bottom);
+  for (HWND dialog : dialogs) DestroyWindow(dialog);
 }
 
 // Puts the block's free into the stand-in's log, so its order against Destroy shows.

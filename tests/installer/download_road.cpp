@@ -5,27 +5,36 @@
 // instructions, Start is pressed and the practice instrument sends its job.
 // Every action is real mouse input or a key typed into a control, from a second thread
 // while this one runs the browser; nothing of ours stands between the steps.
-//   download_road <shell_peer.exe> <receiving folder>
-// Says each step on the terminal and exits 0 only if the job arrived whole and no
-// temporary file stayed behind.
+//   download_road <shell_peer.exe> <receiving folder> <screenshot folder>
+// Says each step on the terminal, saves a picture of the screen after each (BMP), and
+// exits 0 only if the job arrived whole and no temporary file stayed behind.
 #include <windows.h>
 #include <commctrl.h>
 #include <shellapi.h>
 #include <shlobj.h>
+
 #include <atomic>
 #include <set>
 #include <cstdio>
+#include <functional>
 #include <string>
 #include <thread>
+#include <vector>
+
 #include "base/resource_ids.h"
 #include "support/child_process.h"
 #include "support/window_waits.h"
 #include "store/string_table.h"
 #include "transfer/data_test_support.h"
+
 namespace {
+
 const wchar_t kFolder[] = L"::{20D04FE0-3AEA-1069-A2D8-08002B30309D}\\::{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}";
 const wchar_t kLevel[] = L"Road Level";
+std::wstring g_shots;
+int g_shot = 0;
 int g_failures = 0;
+
 void Say(const char* text) {
   std::printf("road: %s\n", text);
   std::fflush(stdout);
@@ -33,6 +42,34 @@ void Say(const char* text) {
 void Check(bool ok, const char* what) {
   if (!ok) std::printf("FAIL: %s\n", what), ++g_failures;
 }
+
+// A picture of the screen's top left 1024x768 as a 24-bit BMP.
+void Shot(const wchar_t* name) {
+  const int width = 1024, height = 768;
+  HDC screen = GetDC(nullptr), memory = CreateCompatibleDC(screen);
+  BITMAPINFOHEADER header{sizeof(header), width, height, 1, 24, BI_RGB};
+  void* bits = nullptr;
+  HBITMAP bitmap = CreateDIBSection(screen, reinterpret_cast<BITMAPINFO*>(&header), DIB_RGB_COLORS, &bits, nullptr, 0);
+  HGDIOBJ old = SelectObject(memory, bitmap);
+  BitBlt(memory, 0, 0, width, height, screen, 0, 0, SRCCOPY);
+  GdiFlush();
+  const DWORD size = width * 3 * height;
+  BITMAPFILEHEADER file{0x4D42, DWORD(sizeof(BITMAPFILEHEADER) + sizeof(header) + size), 0, 0,
+                        DWORD(sizeof(BITMAPFILEHEADER) + sizeof(header))};
+  wchar_t path[MAX_PATH];
+  swprintf(path, MAX_PATH, L"%ls\\%02d-%ls.bmp", g_shots.c_str(), ++g_shot, name);
+  if (FILE* out = _wfopen(path, L"wb")) {
+    std::fwrite(&file, sizeof(file), 1, out);
+    std::fwrite(&header, sizeof(header), 1, out);
+    std::fwrite(bits, 1, size, out);
+    std::fclose(out);
+  }
+  SelectObject(memory, old);
+  DeleteObject(bitmap);
+  DeleteDC(memory);
+  ReleaseDC(nullptr, screen);
+}
+
 // The list of the browser's current view.
 HWND CurrentList(IExplorerBrowser* browser) {
   IShellView* view = nullptr;
@@ -57,6 +94,7 @@ POINT RowPoint(HWND list, int row) {
   ClientToScreen(list, &point);
   return point;
 }
+
 int Road(const std::wstring& peer, const std::wstring& receiving) {
   const std::set<std::wstring> temporaryBefore = TransferFiles();
   HWND frame = CreateWindowExW(0, L"STATIC", L"Marlix Digital Levels", WS_POPUP | WS_VISIBLE | WS_BORDER, 0, 0, 600,
@@ -68,6 +106,7 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
   RECT rect{0, 0, 600, 420};
   FOLDERSETTINGS settings{FVM_DETAILS, 0};
   browser->Initialize(frame, &rect, &settings);
+
   Say("1. Wine's ExplorerBrowser opens My Computer\\Marlix Digital Levels");
   LPITEMIDLIST folder = nullptr;
   Check(SHParseDisplayName(kFolder, nullptr, &folder, 0, nullptr) == S_OK, "the folder's address parses");
@@ -77,6 +116,8 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
   Check(ui::PumpFor([&] { return (root = CurrentList(browser)) && RowOf(root, L"Add New Digital Level") == 0; }),
         "the root lists the add row first");
   ui::PumpFor([&] { return ui::Painted(frame); });
+  Shot(L"folder");
+
   std::atomic<int> step{0};
   std::wstring instructions;
   std::thread person([&] {
@@ -91,6 +132,8 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
     SendMessageW(models, CB_SETCURSEL, SendMessageW(models, CB_FINDSTRINGEXACT, WPARAM(-1),
                                                       LPARAM(LoadTranslatedString(IDS_MODEL_HRB1X).c_str())), 0);
     SendMessageW(page, WM_COMMAND, MAKEWPARAM(IDC_STATION_MODEL, CBN_SELCHANGE), LPARAM(models));
+    ui::WaitFor([&] { return ui::Painted(sheet); });
+    Shot(L"sheet");
     Say("   the sheet is filled in and closed with OK");
     ui::Click(ui::Centre(GetDlgItem(sheet, IDOK)));
     step = 1;
@@ -107,6 +150,8 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
     wchar_t text[2048] = {};
     GetDlgItemTextW(dialog, IDC_TRANSFER_INSTRUCTIONS, text, 2048);
     instructions = text;
+    ui::WaitFor([&] { return ui::Painted(dialog); });
+    Shot(L"download");
     Say("6. The download dialog shows the level's instructions; Start is pressed");
     ui::Click(ui::Centre(GetDlgItem(dialog, IDC_TRANSFER_START)));
     step = 4;
@@ -123,14 +168,20 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
       }
     }
   });
+
   Check(ui::PumpFor([&] { return step == 1; }), "the sheet came up and was closed with OK");
   Check(ui::PumpFor([&] { return RowOf(root, kLevel) > 0; }), "the new level appears in the folder");
   Say("3. The new level appears");
+  ui::PumpFor([&] { return ui::Painted(frame); });
+  Shot(L"level-added");
   step = 2;
   Check(ui::PumpFor([&] {
     HWND list = CurrentList(browser);
     return list && list != root && RowOf(list, L"file1.tkf") == 0;
   }), "the level opens and shows file1.tkf");
+  ui::PumpFor([&] { return ui::Painted(frame); });
+  Shot(L"level-opened");
+
   child::Process receiver(peer, {L"drop", receiving, L"700", L"100", L"60"});
   Check(receiver.Started(), "the receiving program starts");
   ui::PumpFor([] { return FindWindowW(L"MarlixShellPeer", L"Receiver") != nullptr; });
@@ -151,17 +202,22 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
   }
   Check(IsStandInJob(job), "file1.tkf is the practice instrument's job");
   Check(TransferFiles() == temporaryBefore, "the temporary .txt file is gone");
+  Shot(L"done");
   browser->Destroy();
   browser->Release();
   DestroyWindow(frame);
   return g_failures;
 }
+
 }  // namespace
+
 int main() {
   int argc = 0;
   wchar_t** argv = CommandLineToArgvW(GetCommandLineW(), &argc);
-  if (argc < 3) return std::printf("usage: download_road <shell_peer> <receiving folder>\n"), 2;
+  if (argc < 4) return std::printf("usage: download_road <shell_peer> <receiving folder> <shots>\n"), 2;
+  g_shots = argv[3];
   CreateDirectoryW(argv[2], nullptr);
+  CreateDirectoryW(argv[3], nullptr);
   OleInitialize(nullptr);
   int failures = Road(argv[1], argv[2]);
   OleUninitialize();

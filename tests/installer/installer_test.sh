@@ -49,15 +49,15 @@ query "$folder_key\\InprocServer32" /ve | grep -qF 'C:\Program Files\Marlix Digi
   fail "the registration does not name the installed module"
 
 # The road: the add row, the sheet, the new level, its file dragged to another program and
-# downloaded from the practice instrument.
+# downloaded from the practice instrument; a picture of the screen after each step.
 windows() { printf 'Z:%s' "${1//\//\\}"; }
 rm -rf "$road_dir"
-mkdir -p "$road_dir/received"
+mkdir -p "$road_dir/received" "$road_dir/screens"
 # The road runs with the diagnostic log switched on as README tells a support person to.
 view_key='HKCU\Software\Gravon\Shell Extensions\Marlix DL View'
 run reg add "$view_key" /v "Diagnostic Log" /t REG_DWORD /d 1 /f >/dev/null || fail "cannot switch the log on"
 start=$(date +%s)
-run "$road" "$(windows "$peer")" "$(windows "$road_dir/received")" ||
+run "$road" "$(windows "$peer")" "$(windows "$road_dir/received")" "$(windows "$road_dir/screens")" ||
   fail "the download road"
 echo "the download road took $(( $(date +%s) - start )) s"
 run reg delete "$view_key" /v "Diagnostic Log" /f >/dev/null
@@ -70,6 +70,7 @@ else
   grep -q "ReceiveFile answered 0" "$road_log" || fail "the log has no answer of the instrument to ReceiveFile"
   grep -q "transfer ended with 0" "$road_log" || fail "the log has no end of the transfer"
 fi
+for shot in "$road_dir"/screens/*.bmp; do /usr/bin/convert "$shot" "${shot%.bmp}.png" && rm "$shot"; done
 
 uninstall
 [ -e "$target" ] && fail "files left behind: $(ls "$target")"

@@ -11,12 +11,10 @@ struct LoadedDll {
   LoadedDll() {  // MARLIX_DLL_PATH is the build's Unix path; Wine maps it through drive Z:.
     for (char c : std::string(MARLIX_DLL_PATH)) path += c == '/' ? L'\\' : wchar_t(c);
     if (!(module = LoadLibraryW(path.c_str()))) return;
-    Bind("DllCanUnloadNow", &canUnloadNow);
-    Bind("DllGetClassObject", &getClassObject);
+    canUnloadNow = reinterpret_cast<decltype(canUnloadNow)>(GetProcAddress(module, "DllCanUnloadNow"));
+    getClassObject = reinterpret_cast<decltype(getClassObject)>(GetProcAddress(module, "DllGetClassObject"));
   }
   ~LoadedDll() { if (module) FreeLibrary(module); }
-  template <class F>
-  void Bind(const char* name, F* f) { *f = reinterpret_cast<F>(reinterpret_cast<void*>(GetProcAddress(module, name))); }
   std::wstring path = L"Z:";
   HMODULE module = nullptr;
   HRESULT(STDAPICALLTYPE* canUnloadNow)() = nullptr;

@@ -67,7 +67,10 @@ TEST(TranslateFile, EscapesPairingAndTails) {
   EXPECT_EQ(file.Find(L"a\nb\\", false), L"x\\\n\t");
   EXPECT_EQ(file.Find(L"x\\\n\t", true), L"a\nb\\");
   // Pairing follows the line rules; a tail picks its own entry or falls back to the plain one.
-  file = Parsed(L"; comment\r\n[Open#$menu]\n[Öffnen]\n[Open]\n[Offen]\n"
+  // Lines longer than any 16-bit count are neither kept nor skipped.
+  const std::wstring longText(70000, L'x');
+  file = Parsed(L"[" + longText + L"\r\n[" + longText + L"]\n[long]\n"
+                L"; comment\r\n[Open#$menu]\n[Öffnen]\n[Open]\n[Offen]\n"
                 L"[]\n[first]\nnot a bracket line\n[erste]\r\n [indented]\n[dropped]\n[]\n[again]\n[wieder]\n"
                 L"[lone bracket\n[a]b]c\n[t]x\n[dup]\r\r\n\n[one]\r[dup]\n[two]\n[other]\n[one]\n[orphan]");
   struct { const wchar_t *text, *found; bool reverse; const char* why; } rows[] = {
@@ -79,9 +82,10 @@ TEST(TranslateFile, EscapesPairingAndTails) {
       {L"orphan", L""},
       {L"Open#$menu", L"Öffnen"},
       {L"Open#$button", L"Offen", false, "falls back to the plain entry"},
-      {L"Öffnen", L"Open#$menu", true}};
+      {L"Öffnen", L"Open#$menu", true},
+      {longText.c_str(), L"long", false, "no limit on a line"}};
   for (const auto& r : rows) EXPECT_EQ(file.Find(r.text, r.reverse), r.found) << r.text << " " << (r.why ?: "");
-  EXPECT_EQ(file.Size(), 7u);
+  EXPECT_EQ(file.Size(), 8u);
   EXPECT_EQ(Parsed(L"[src]\n[last line]").Find(L"src", false), L"last line");
 }
 TEST(TranslateFile, LoadRefusesAnythingButUtf16WithMarkAndTakesHugeFiles) {
@@ -100,14 +104,6 @@ TEST(TranslateFile, LoadRefusesAnythingButUtf16WithMarkAndTakesHugeFiles) {
   // A stray last byte is no character and is never read.
   EXPECT_EQ(LoadBytes(testfiles::Utf16File(L"[k]\n[v]") + "\x5D", &file), S_OK);
   EXPECT_EQ(file.Find(L"k", false), L"v");
-}
-// Lines longer than any 16-bit count: no limit on a line, neither kept nor skipped.
-TEST(TranslateFile, LinesHaveNoLengthLimit) {
-  const std::wstring longText(70000, L'x');
-  const CTranslateFile file = Parsed(L"[big]\r\n[groß]\r\n[" + longText + L"\r\n[" + longText + L"]\n[long]\n");
-  EXPECT_EQ(file.Find(L"big", false), L"groß");
-  EXPECT_EQ(file.Find(longText, false), L"long");
-  EXPECT_EQ(file.Size(), 2u);
 }
 TEST(TranslateFile, RandomMutationsNeverReadPastTheEnd) {
   const std::wstring base =

@@ -1,17 +1,12 @@
 // Explorer's own shell32 finds the installed folder under My Computer and lists its levels.
-// Asks Wine's shell32, as any client would, for the folder under My Computer. Prints
-//   computer: <name>   for each item of My Computer that is the folder
-//   level: <name>      for each level the folder shows
-// and exits with 1 if the shell cannot bind to the folder.
+// Prints "computer: <name>" for each item of My Computer that is the folder, "level: <name>" for
+// each level the folder shows, and exits with 1 if the shell cannot bind to the folder.
 #include <windows.h>
 #include <shlobj.h>
 #include <shlwapi.h>
-
 #include <cstdio>
-
 namespace {
 const wchar_t kFolderPath[] = L"::{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}";
-
 void PrintNames(IShellFolder* folder, const char* label, bool onlyTheFolder) {
   IEnumIDList* items = nullptr;
   if (folder->EnumObjects(nullptr, SHCONTF_FOLDERS, &items) != S_OK) return;
@@ -33,7 +28,6 @@ void PrintNames(IShellFolder* folder, const char* label, bool onlyTheFolder) {
   items->Release();
 }
 }  // namespace
-
 int wmain() {
   if (FAILED(CoInitialize(nullptr))) return 1;
   int result = 1;

@@ -3,14 +3,10 @@
 #include <gtest/gtest.h>
 #include <windows.h>
 #include <commctrl.h>
-#include <objidl.h>
 #include <shlobj.h>
 #include <atomic>
 #include <cstdio>
-#include <cstdlib>
 #include <functional>
-#include <new>
-#include <utility>
 #include "shell/shell_folder.h"
 #include "base/class_ids.h"
 #include "base/com_base.h"
@@ -42,23 +38,20 @@ bool ShouldFail() noexcept {
   return true;
 }
 void* Allocate(size_t size) noexcept {
-  if (ShouldFail()) return nullptr;
-  void* block = std::malloc(size ? size : 1);
-  if (block) ++liveBlocks;
+  void* block = ShouldFail() ? nullptr : std::malloc(size ? size : 1);
+  liveBlocks += block != nullptr;
   return block;
 }
 void Release(void* block) noexcept {
-  if (!block) return;
-  --liveBlocks;
+  liveBlocks -= block != nullptr;
   std::free(block);
 }
 // The task allocator, through which item ids and returned strings go.
 class Spy final : public IMallocSpy {
  public:
   STDMETHODIMP QueryInterface(REFIID riid, void** ppv) override {
-    if (riid != IID_IUnknown && riid != IID_IMallocSpy) return *ppv = nullptr, E_NOINTERFACE;
-    *ppv = this;
-    return S_OK;
+    *ppv = riid == IID_IUnknown || riid == IID_IMallocSpy ? this : nullptr;
+    return *ppv ? S_OK : E_NOINTERFACE;
   }
   STDMETHODIMP_(ULONG) AddRef() override { return 2; }
   STDMETHODIMP_(ULONG) Release() override { return 1; }
@@ -85,19 +78,12 @@ class Spy final : public IMallocSpy {
   STDMETHODIMP_(void) PostHeapMinimize() override {}
 } spy;
 }  // namespace
+// The runtime's other forms (arrays, sizes, nothrow) come through these two.
 void* operator new(size_t size) {
   if (void* block = Allocate(size)) return block;
   throw std::bad_alloc();
 }
-void* operator new[](size_t size) { return operator new(size); }
-void* operator new(size_t size, const std::nothrow_t&) noexcept { return Allocate(size); }
-void* operator new[](size_t size, const std::nothrow_t&) noexcept { return Allocate(size); }
 void operator delete(void* block) noexcept { Release(block); }
-void operator delete[](void* block) noexcept { Release(block); }
-void operator delete(void* block, size_t) noexcept { Release(block); }
-void operator delete[](void* block, size_t) noexcept { Release(block); }
-void operator delete(void* block, const std::nothrow_t&) noexcept { Release(block); }
-void operator delete[](void* block, const std::nothrow_t&) noexcept { Release(block); }
 namespace {
 const wchar_t kStore[] = L"Software\\Gravon\\Shell Extensions\\Marlix DL View\\Levels\\Station ";
 // What the host does in one row, releasing everything it got.
@@ -167,9 +153,7 @@ void FolderItemObjects() {
     com::ComPtr<IDataObject> data;
     if (object->QueryInterface(IID_IQueryInfo, info.PutVoid()) == S_OK) {
       LPWSTR tip = nullptr;
-      if (info->GetInfoTip(0, &tip) == S_OK) {
-        EXPECT_NE(tip[0], L'\0') << "a tip object without its item";
-      }
+      EXPECT_TRUE(info->GetInfoTip(0, &tip) != S_OK || tip[0]) << "a tip object without its item";
       CoTaskMemFree(tip);
     }
     if (object.As(&data) == S_OK) {
@@ -201,21 +185,16 @@ void DataObjectFormats() {
   }
   IEnumFORMATETC* formats = nullptr;
   if (object->EnumFormatEtc(DATADIR_GET, &formats) == S_OK) {
-    FORMATETC entry;
-    while (formats->Next(1, &entry, nullptr) == S_OK) {
-    }
+    for (FORMATETC entry; formats->Next(1, &entry, nullptr) == S_OK;) continue;
     formats->Release();
   }
 }
 // The least a browser must answer for a view to open in it; made with counting paused.
 class Browser : public com::ComObject<IShellBrowser> {
  public:
-  Browser() {
-    frame = CreateWindowExW(0, L"STATIC", nullptr, WS_OVERLAPPEDWINDOW, 0, 0, 400, 300, nullptr, nullptr, nullptr,
-                            nullptr);
-  }
   ~Browser() override { DestroyWindow(frame); }
-  HWND frame;
+  HWND frame = CreateWindowExW(0, L"STATIC", nullptr, WS_OVERLAPPEDWINDOW, 0, 0, 400, 300, nullptr, nullptr, nullptr,
+                               nullptr);
   STDMETHODIMP GetWindow(HWND* window) override { return *window = frame, S_OK; }
   STDMETHODIMP ContextSensitiveHelp(BOOL) override { return E_NOTIMPL; }
   int lent = 0;  // menus filled with this browser's popups and not given back
@@ -297,9 +276,7 @@ void View(bool fill, bool use = false) {
         const auto filled = [&] {
           return PumpUntil([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); }, 5000);
         };
-        if (fill) {
-          EXPECT_TRUE(filled()) << "the clip still plays";
-        }
+        EXPECT_TRUE(!fill || filled()) << "the clip still plays";
         if (use) {
           LVITEMW selected{};
           selected.stateMask = selected.state = LVIS_SELECTED;

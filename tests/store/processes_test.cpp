@@ -68,30 +68,20 @@ TEST(StoreProcesses, Child) {
     EXPECT_EQ(found.Port, port) << testing::PrintToString(name);
   }
   for (int k = 0; k < kLevelsEach; ++k) {
-    const std::wstring name = LevelName(me, k, false);
-    CStationRecord gone = Level(name, -1);
-    if (!expected.count(name)) {
-      EXPECT_EQ(FindStation(gone), E_FAIL) << testing::PrintToString(name);
-    }
+    CStationRecord gone = Level(LevelName(me, k, false), -1);
+    EXPECT_TRUE(expected.count(gone.Name) || FindStation(gone) == E_FAIL) << testing::PrintToString(gone.Name);
   }
 }
 // Every key's Name, in enumeration order.
 std::vector<std::wstring> StoredNames() {
   std::vector<std::wstring> names;
   win::UniqueHKey levels;
-  if (RegOpenKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, KEY_READ, levels.Put()) != ERROR_SUCCESS)
-    return names;
-  for (DWORD index = 0;; ++index) {
-    wchar_t key[260];
-    DWORD length = 260;
-    if (RegEnumKeyExW(levels.Get(), index, key, &length, nullptr, nullptr, nullptr, nullptr) != ERROR_SUCCESS) break;
-    win::UniqueHKey level;
-    wchar_t name[300] = L"<no name>";
-    DWORD bytes = sizeof(name);
-    if (RegOpenKeyExW(levels.Get(), key, 0, KEY_READ, level.Put()) == ERROR_SUCCESS)
-      RegGetValueW(level.Get(), nullptr, L"Name", RRF_RT_REG_SZ, nullptr, name, &bytes);
-    names.push_back(name);
-  }
+  RegOpenKeyExW(HKEY_CURRENT_USER, GetLevelsKeyName().c_str(), 0, KEY_READ, levels.Put());
+  wchar_t key[260];
+  for (DWORD index = 0, length = 260;
+       RegEnumKeyExW(levels.Get(), index, key, &length, nullptr, nullptr, nullptr, nullptr) == ERROR_SUCCESS;
+       ++index, length = 260)
+    names.push_back(RegReadString(HKEY_CURRENT_USER, GetLevelsKeyName() + L"\\" + key, L"Name"));
   return names;
 }
 TEST(StoreProcesses, TwentyAtOnce) {
@@ -121,7 +111,8 @@ TEST(StoreProcesses, TwentyAtOnce) {
   count.erase(L"shared");
   for (const auto& [name, times] : count) EXPECT_EQ(times, 1) << testing::PrintToString(name);
   size_t kept = 0;
-  for (int i = 0; i < kProcesses; ++i) kept += RegReadDword(HKEY_CURRENT_USER, kResults, (L"kept " + std::to_wstring(i)).c_str(), 0);
+  for (int i = 0; i < kProcesses; ++i)
+    kept += RegReadDword(HKEY_CURRENT_USER, kResults, (L"kept " + std::to_wstring(i)).c_str(), 0);
   EXPECT_EQ(count.size(), kept) << "levels lost or left over";
   EXPECT_GE(sharedAdds, 1);
   SetEvent(check.Get());

@@ -41,7 +41,6 @@ TEST_F(Store, PathsParsingNameAndValidity) {
   wchar_t buffer[MAX_PATH];
   EXPECT_EQ(m.GetPath(one.Get(), buffer, MAX_PATH), 3u);
   EXPECT_STREQ(buffer, L"abc");
-  EXPECT_EQ(m.GetPath(one.Get(), nullptr, 0), 5u);
   List full(m.CreateListFromPath(L"/Marlix Digital Levels/L1/file1.tkf"));
   UINT needed = m.GetPath(full.Get(), nullptr, 0);
   EXPECT_EQ(needed, 21u + 1 + 2 + 1 + 9 + 1 + 1);
@@ -71,25 +70,13 @@ TEST_F(Store, AddGivesUpOnAFailureOtherThanAnExistingKey) {
   ASSERT_EQ(RegCreateKeyExW(kUser, kLevels.c_str(), 0, nullptr, REG_OPTION_VOLATILE, KEY_ALL_ACCESS, nullptr, &levels,
                             nullptr), ERROR_SUCCESS);
   RegCloseKey(levels);
-  static HRESULT added;
-  added = E_PENDING;
+  static HRESULT added = E_PENDING;
   HANDLE adding = CreateThread(nullptr, 0, [](void*) -> DWORD { return added = Add(L"new"), 0; }, nullptr, 0, nullptr);
   const bool ended = WaitForSingleObject(adding, 10000) == WAIT_OBJECT_0;
   if (!ended) TerminateThread(adding, 0);
   CloseHandle(adding);
   EXPECT_TRUE(ended) << "AddStation went on trying";
   EXPECT_EQ(added, E_FAIL);
-}
-TEST_F(Store, AddWritesEveryValueAndFindReadsThemBack) {
-  CStationRecord added = Full(L"Level one", 10);
-  ASSERT_EQ(AddStation(added), S_OK);
-  CStationRecord found = Named(L"Level one");
-  ASSERT_EQ(FindStation(found), S_OK);
-  EXPECT_TRUE(Fields(found) == Fields(added));
-  CStationRecord again = Named(L"Level one");
-  EXPECT_EQ(AddStation(again), E_INVALIDARG);
-  EXPECT_TRUE(Fields(again) == Fields(added)) << "adding a taken name fails and hands back the stored level";
-  EXPECT_FALSE(RegKeyExists(kUser, LevelPath(1)));
 }
 TEST_F(Store, NumbersFillGapsNamesCountCaseAndDeleteTakesTheTree) {
   for (int n : {0, 2}) RegWriteString(kUser, LevelPath(n), L"Name", L"taken");
@@ -126,6 +113,9 @@ TEST_F(Store, OnlyWhatReadsBackWholeIsWrittenAndLockedLevels) {
   CStationRecord found = Named(longest);
   ASSERT_EQ(FindStation(found), S_OK);
   EXPECT_TRUE(Fields(found) == Fields(full)) << "the longest name and note read back, and the fields after them";
+  CStationRecord again = Named(longest);
+  EXPECT_EQ(AddStation(again), E_INVALIDARG);
+  EXPECT_TRUE(Fields(again) == Fields(full)) << "adding a taken name fails and hands back the stored level";
   const std::tuple<std::wstring, std::wstring, std::wstring> unstorable[] = {  // name, note, model
       {longest + L"a", L"", L""},
       {L"", L"", L""},

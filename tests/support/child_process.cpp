@@ -1,8 +1,6 @@
 // Starting and ending the programs a test drives beside itself, with a deadline on each wait.
 #include "support/child_process.h"
-
 namespace child {
-
 Process::Process(const std::wstring& program, const std::vector<std::wstring>& arguments) {
   std::wstring command = L"\"" + program + L"\"";
   for (const std::wstring& argument : arguments)
@@ -14,41 +12,34 @@ Process::Process(const std::wstring& program, const std::vector<std::wstring>& a
   CloseHandle(info.hThread);
   process_ = info.hProcess;
 }
-
 Process::~Process() {
   Kill();
   if (process_) CloseHandle(process_);
 }
-
 bool Process::Wait(DWORD milliseconds) {
   if (!process_) return false;
   if (WaitForSingleObject(process_, milliseconds) == WAIT_OBJECT_0) return true;
   Kill();
   return false;
 }
-
 DWORD Process::ExitCode() const {
   DWORD code = kNotEnded;
   if (process_) GetExitCodeProcess(process_, &code);
   return code;
 }
-
 void Process::Kill() {
   if (process_ && WaitForSingleObject(process_, 0) == WAIT_TIMEOUT) {
     TerminateProcess(process_, kKilled);
     WaitForSingleObject(process_, 5000);
   }
 }
-
 DWORD Run(const std::wstring& program, const std::vector<std::wstring>& arguments, DWORD milliseconds) {
   Process process(program, arguments);
   return process.Wait(milliseconds) ? process.ExitCode() : Process::kKilled;
 }
-
 std::wstring SelfPath() {
   wchar_t path[MAX_PATH] = {};
   GetModuleFileNameW(nullptr, path, MAX_PATH);
   return path;
 }
-
 }  // namespace child

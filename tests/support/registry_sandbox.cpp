@@ -1,14 +1,11 @@
 // Scratch registry roots for tests, deleted again when the test ends.
 #include "support/registry_sandbox.h"
-
 #include <atomic>
 #include <stdexcept>
-
 namespace {
 std::atomic<unsigned> g_sandboxes{0};
 const wchar_t kScratchRoot[] = L"Software\\MarlixTestScratch";
 }  // namespace
-
 RegistrySandbox::RegistrySandbox(std::vector<HKEY> roots) {
   unsigned n = ++g_sandboxes;
   for (HKEY root : roots) {
@@ -26,7 +23,6 @@ RegistrySandbox::RegistrySandbox(std::vector<HKEY> roots) {
   for (auto& o : overrides_)
     if (RegOverridePredefKey(o.root, o.scratch) != ERROR_SUCCESS) throw std::runtime_error("cannot redirect root");
 }
-
 RegistrySandbox::~RegistrySandbox() {
   for (auto& o : overrides_) RegOverridePredefKey(o.root, nullptr);
   for (auto& o : overrides_) {
@@ -34,20 +30,17 @@ RegistrySandbox::~RegistrySandbox() {
     RegDeleteTreeW(HKEY_CURRENT_USER, o.path.c_str());
   }
 }
-
 const std::wstring& RegistrySandbox::ScratchPath(HKEY root) const {
   for (auto& o : overrides_)
     if (o.root == root) return o.path;
   throw std::logic_error("root not redirected");
 }
-
 bool RegKeyExists(HKEY root, const std::wstring& path) {
   HKEY k = nullptr;
   if (RegOpenKeyExW(root, path.c_str(), 0, KEY_READ, &k) != ERROR_SUCCESS) return false;
   RegCloseKey(k);
   return true;
 }
-
 std::wstring RegReadString(HKEY root, const std::wstring& path, const wchar_t* value) {
   wchar_t buf[1024] = {};
   DWORD size = sizeof(buf) - sizeof(wchar_t);
@@ -56,17 +49,14 @@ std::wstring RegReadString(HKEY root, const std::wstring& path, const wchar_t* v
     return L"<missing>";
   return buf;
 }
-
 DWORD RegReadDword(HKEY root, const std::wstring& path, const wchar_t* value, DWORD fallback) {
   DWORD v = 0, size = sizeof(v);
   if (RegGetValueW(root, path.c_str(), value, RRF_RT_REG_DWORD, nullptr, &v, &size) != ERROR_SUCCESS) return fallback;
   return v;
 }
-
 void RegWriteString(HKEY root, const std::wstring& path, const wchar_t* value, const std::wstring& data) {
   RegSetKeyValueW(root, path.c_str(), value, REG_SZ, data.c_str(), DWORD((data.size() + 1) * sizeof(wchar_t)));
 }
-
 void RegWriteDword(HKEY root, const std::wstring& path, const wchar_t* value, DWORD data) {
   RegSetKeyValueW(root, path.c_str(), value, REG_DWORD, &data, sizeof(data));
 }

@@ -3,26 +3,19 @@
 #include <windows.h>
 #include <string>
 #include <vector>
-
-// Redirects predefined registry roots onto fresh scratch keys for the life of the
-// object, so each test starts from an empty registry and leaves nothing behind.
+// The roots are redirected onto fresh scratch keys for the life of the object.
 class RegistrySandbox {
  public:
-  // By default only HKEY_CURRENT_USER is redirected.
   explicit RegistrySandbox(std::vector<HKEY> roots = {HKEY_CURRENT_USER});
   ~RegistrySandbox();
   RegistrySandbox(const RegistrySandbox&) = delete;
   RegistrySandbox& operator=(const RegistrySandbox&) = delete;
-
   // The real path of the scratch key behind a redirected root, under the real HKEY_CURRENT_USER.
   const std::wstring& ScratchPath(HKEY root) const;
-
  private:
   struct Override { HKEY root; std::wstring path; HKEY scratch; };
   std::vector<Override> overrides_;
 };
-
-// Small registry helpers for assertions.
 bool RegKeyExists(HKEY root, const std::wstring& path);
 std::wstring RegReadString(HKEY root, const std::wstring& path, const wchar_t* value);
 DWORD RegReadDword(HKEY root, const std::wstring& path, const wchar_t* value, DWORD fallback = 0xDEADBEEF);

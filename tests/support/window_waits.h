@@ -1,11 +1,8 @@
 // Waiting for windows and driving them as a person would, for the threads that drive modal dialogs.
 #pragma once
 #include <windows.h>
-
 #include <string>
-
 namespace ui {
-
 // Waits without handling messages, for a thread beside the one that owns the windows.
 // Gives up after `milliseconds`, so a failing test cannot hang.
 template <class Condition>
@@ -14,7 +11,6 @@ bool WaitFor(Condition condition, DWORD milliseconds = 10000) {
     if (GetTickCount64() > end) return false;
   return true;
 }
-
 // Waits while handling this thread's messages, for the thread that owns the windows.
 template <class Condition>
 bool PumpFor(Condition condition, DWORD milliseconds = 30000) {
@@ -28,30 +24,25 @@ bool PumpFor(Condition condition, DWORD milliseconds = 30000) {
   }
   return true;
 }
-
 inline std::wstring Text(HWND window, int id = -1) {  // of control `id`, or of the window itself
   wchar_t text[2048] = {};
   GetWindowTextW(id < 0 ? window : GetDlgItem(window, id), text, 2048);
   return text;
 }
-
 inline bool OfThisProcess(HWND window) {
   DWORD process = 0;
   return IsWindowVisible(window) && GetWindowThreadProcessId(window, &process) && process == GetCurrentProcessId();
 }
-
 inline HWND OwnedDialog(HWND owner) {  // a visible dialog window or message box of this process
   for (HWND found = nullptr; (found = FindWindowExW(nullptr, found, L"#32770", nullptr)) != nullptr;)
     if (GetWindow(found, GW_OWNER) == owner && OfThisProcess(found)) return found;
   return nullptr;
 }
-
 inline HWND DialogWith(int control) {  // a visible dialog of this process with a child of id `control`
   for (HWND found = nullptr; (found = FindWindowExW(nullptr, found, L"#32770", nullptr)) != nullptr;)
     if (OfThisProcess(found) && GetDlgItem(found, control)) return found;
   return nullptr;
 }
-
 // True once the window and its children have nothing left to paint.
 inline bool Painted(HWND window) {
   if (GetUpdateRect(window, nullptr, FALSE)) return false;
@@ -59,13 +50,11 @@ inline bool Painted(HWND window) {
     if (IsWindowVisible(c) && !Painted(c)) return false;
   return true;
 }
-
 inline POINT Centre(HWND window) {
   RECT rect{};
   GetWindowRect(window, &rect);
   return {(rect.left + rect.right) / 2, (rect.top + rect.bottom) / 2};
 }
-
 // Real mouse input: `flags` at `at` on the screen; a move waits until the pointer is there.
 inline bool Mouse(DWORD flags, POINT at) {
   INPUT input{INPUT_MOUSE};
@@ -78,7 +67,6 @@ inline bool Mouse(DWORD flags, POINT at) {
     return GetCursorPos(&now) && now.x == at.x && now.y == at.y;
   }, 2000);
 }
-
 inline void Click(POINT at, int times = 1) {
   Mouse(0, at);
   for (int i = 0; i < times; ++i) {
@@ -86,7 +74,6 @@ inline void Click(POINT at, int times = 1) {
     Mouse(MOUSEEVENTF_LEFTUP, at);
   }
 }
-
 // Presses at `from`, moves in steps to `to` and lets go there. The system's drag loop reads the
 // pointer on its own clock and shows nothing a test could wait on, so the steps are paced.
 inline void Drag(POINT from, POINT to, int steps = 20) {
@@ -99,11 +86,9 @@ inline void Drag(POINT from, POINT to, int steps = 20) {
   Sleep(200);
   Mouse(MOUSEEVENTF_LEFTUP, to);
 }
-
 // Text typed into an edit control, replacing what it held.
 inline void Type(HWND edit, const wchar_t* text) {
   SendMessageW(edit, EM_SETSEL, 0, -1);
   for (const wchar_t* c = text; *c; ++c) SendMessageW(edit, WM_CHAR, *c, 0);
 }
-
 }  // namespace ui

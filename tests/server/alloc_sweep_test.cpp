@@ -78,12 +78,13 @@ class Spy final : public IMallocSpy {
   STDMETHODIMP_(void) PostHeapMinimize() override {}
 } spy;
 }  // namespace
-// The runtime's other forms (arrays, sizes, nothrow) come through these two.
+// The runtime's other forms (arrays, nothrow) come through these.
 void* operator new(size_t size) {
   if (void* block = Allocate(size)) return block;
   throw std::bad_alloc();
 }
 void operator delete(void* block) noexcept { Release(block); }
+void operator delete(void* block, size_t) noexcept { Release(block); }
 namespace {
 const wchar_t kStore[] = L"Software\\Gravon\\Shell Extensions\\Marlix DL View\\Levels\\Station ";
 // What the host does in one row, releasing everything it got.

@@ -11,8 +11,9 @@ struct LoadedDll {
   LoadedDll() {  // MARLIX_DLL_PATH is the build's Unix path; Wine maps it through drive Z:.
     for (char c : std::string(MARLIX_DLL_PATH)) path += c == '/' ? L'\\' : wchar_t(c);
     if (!(module = LoadLibraryW(path.c_str()))) return;
-    canUnloadNow = reinterpret_cast<decltype(canUnloadNow)>(GetProcAddress(module, "DllCanUnloadNow"));
-    getClassObject = reinterpret_cast<decltype(getClassObject)>(GetProcAddress(module, "DllGetClassObject"));
+    canUnloadNow = reinterpret_cast<decltype(canUnloadNow)>(reinterpret_cast<void*>(GetProcAddress(module, "DllCanUnloadNow")));
+    getClassObject = reinterpret_cast<decltype(getClassObject)>(
+        reinterpret_cast<void*>(GetProcAddress(module, "DllGetClassObject")));
   }
   ~LoadedDll() { if (module) FreeLibrary(module); }
   std::wstring path = L"Z:";

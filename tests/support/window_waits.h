@@ -78,6 +78,7 @@ inline void Click(POINT at, int times = 1) {
 // pointer on its own clock and shows nothing a test could wait on, so the steps are paced.
 inline void Drag(POINT from, POINT to, int steps = 20) {
   Mouse(0, from);
+  Sleep(200);  // as a hand rests on the item: the press must find the row under the pointer
   Mouse(MOUSEEVENTF_LEFTDOWN, from);
   for (int i = 1; i <= steps; ++i) {
     Sleep(40);

@@ -14,6 +14,7 @@
 #include "config/sheet_driver.h"
 #include "shell/shell_test_util.h"
 #include "store/station_record.h"
+#include "support/child_process.h"
 
 namespace {
 
@@ -25,28 +26,12 @@ bool SawCopy(const std::string& report) {
 
 // The second process: shell_peer, its output in a file read when it has ended.
 struct Peer {
-  explicit Peer(const std::wstring& arguments) {
-    wchar_t folder[MAX_PATH];
-    GetTempPathW(MAX_PATH, folder);
-    output = std::wstring(folder) + L"drop_peer_" + std::to_wstring(GetCurrentProcessId()) + L".txt";
-    SECURITY_ATTRIBUTES inherit{sizeof(inherit), nullptr, TRUE};
-    HANDLE file = CreateFileW(output.c_str(), GENERIC_WRITE, FILE_SHARE_READ, &inherit, CREATE_ALWAYS, 0, nullptr);
-    STARTUPINFOW startup{sizeof(startup)};
-    startup.dwFlags = STARTF_USESTDHANDLES;
-    startup.hStdOutput = startup.hStdError = file;
+  explicit Peer(const std::vector<std::wstring>& arguments) : process(PeerPath(), arguments, output) {}
+  ~Peer() { process.Kill(), DeleteFileW(output.c_str()); }
+  static std::wstring PeerPath() {
     wchar_t peer[MAX_PATH] = {};
     GetEnvironmentVariableW(L"MARLIX_SHELL_PEER", peer, MAX_PATH);
-    std::wstring command = L"\"" + std::wstring(peer) + L"\" " + arguments;
-    PROCESS_INFORMATION info{};
-    if (CreateProcessW(nullptr, command.data(), nullptr, nullptr, TRUE, 0, nullptr, nullptr, &startup, &info)) {
-      process = info.hProcess;
-      CloseHandle(info.hThread);
-    }
-    CloseHandle(file);
-  }
-  ~Peer() {
-    if (process) TerminateProcess(process, 9), CloseHandle(process);
-    DeleteFileW(output.c_str());
+    return peer;
   }
   std::string Output() const {
     std::ifstream in{std::filesystem::path(output)};
@@ -54,8 +39,9 @@ struct Peer {
     text << in.rdbuf();
     return text.str();
   }
-  HANDLE process = nullptr;
-  std::wstring output;
+  std::wstring output =
+      (std::filesystem::temp_directory_path() / (L"drop_peer_" + std::to_wstring(GetCurrentProcessId()) + L".txt"));
+  child::Process process;
 };
 
 // The root view in Wine's ExplorerBrowser, on screen at the top left, over a store of two
@@ -99,7 +85,7 @@ class DropOnRootView : public testing::Test {
   // The peer drags `items` from its window onto `row` as a hand would; answers the peer's
   // report and, in `seen`, the selection once the pointer rests on the row.
   std::string DragOnto(int row, const std::wstring& items, std::vector<int>& seen) {
-    Peer peer(L"drag 500 20 30 " + items);
+    Peer peer({L"drag", L"500", L"20", L"30", items});
     if (!PumpUntil([&] { return peer.Output().find("ready") != std::string::npos; }, 20000)) return "peer not ready";
     std::atomic<bool> resting{false}, release{false};
     POINT to = RowPoint(row);
@@ -119,7 +105,7 @@ class DropOnRootView : public testing::Test {
     PumpUntil([&] { return resting && Selected() == std::vector<int>{row}; }, 5000);
     seen = Selected();
     release = true;
-    PumpUntil([&] { return WaitForSingleObject(peer.process, 0) == WAIT_OBJECT_0; }, 20000);
+    PumpUntil([&] { return peer.process.ExitCode() != child::Process::kNotEnded; }, 20000);
     hand.join();
     return peer.Output();
   }
@@ -138,7 +124,7 @@ TEST_F(DropOnRootView, FilesFromAnotherProcessLightUpALevelAndAreRefused) {
   GetTempPathW(MAX_PATH, temp);
   const std::wstring file = std::wstring(temp) + L"survey.txt";
   std::ofstream(std::filesystem::path(file)) << "points";
-  const std::pair<int, std::wstring> drags[] = {{1, L"\"" + file + L"\""},
+  const std::pair<int, std::wstring> drags[] = {{1, file},
                                                 {2, std::wstring(kFolderPath) + L"\\Alpha\\file1.tkf"}};
   for (const auto& [row, items] : drags) {
     ListView_SetItemState(list_, 0, LVIS_SELECTED, LVIS_SELECTED);

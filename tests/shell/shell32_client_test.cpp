@@ -42,12 +42,13 @@ TEST(Shell32Client, ShowsALevelUnderMyComputerWithItsNameAttributesIconAndTip) {
 }
 
 // A person presses `key`, with Ctrl if told, with the focus in `window`, and the host goes on
-// until `done`: its loop hands every key to `view`, the current one, first as Explorer's window does.
-bool Type(HWND window, WORD key, const std::function<bool()>& done, IShellView* view, bool ctrl = false) {
+// until `done`. `view`, if given, is the host's current view, to which its loop hands every key
+// first as Explorer's window does; otherwise the host is another thread.
+bool Type(HWND window, WORD key, const std::function<bool()>& done, IShellView* view = nullptr, bool ctrl = false) {
   HWND top = GetAncestor(window, GA_ROOT);
   SetForegroundWindow(top);
   SendMessageW(top, WM_NEXTDLGCTL, reinterpret_cast<WPARAM>(window), TRUE);
-  SetFocus(window);
+  if (view) SetFocus(window);
   std::vector<INPUT> keys;
   const auto press = [&](WORD vk, DWORD flags) {
     keys.push_back({INPUT_KEYBOARD});
@@ -59,6 +60,7 @@ bool Type(HWND window, WORD key, const std::function<bool()>& done, IShellView* 
   press(key, KEYEVENTF_KEYUP);
   if (ctrl) press(VK_CONTROL, KEYEVENTF_KEYUP);
   SendInput(static_cast<UINT>(keys.size()), keys.data(), sizeof(INPUT));
+  if (!view) return ui::WaitFor(done);
   for (DWORD start = GetTickCount(); !done(); MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT)) {
     if (GetTickCount() - start > 10000) return false;
     for (MSG msg; PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE); DispatchMessageW(&msg))
@@ -123,13 +125,24 @@ TEST(ExplorerBrowserClient, ShowsTheLevelsAndMovesIntoALevelWhenItIsActivated) {
 }
 
 // comdlg32's Open dialog, driven from a second thread as a person would; the dialog's
-// own thread only answers what the hook asks of it. Keys in the view are the ExplorerBrowser's test.
+// own thread only answers what the hook asks of it.
 struct OpenDialogRun {
   std::atomic<HWND> hook{nullptr}, dialog{nullptr};
   std::atomic<int> fileOk{0};
 };
 OpenDialogRun* openDialog = nullptr;
 constexpr UINT kBrowseTo = WM_APP + 1;
+
+// Windows' file dialog hands every key of its loop to its view first; Wine's never asks its
+// view, so this hook on the dialog's thread does what Windows' dialog does.
+LRESULT CALLBACK ViewKeysFirst(int code, WPARAM wParam, LPARAM lParam) {
+  auto* msg = reinterpret_cast<MSG*>(lParam);
+  auto* browser = reinterpret_cast<IShellBrowser*>(SendMessageW(openDialog->dialog, WM_USER + 7, 0, 0));
+  com::ComPtr<IShellView> view;
+  if (code == MSGF_DIALOGBOX && msg->message == WM_KEYDOWN && browser && browser->QueryActiveShellView(view.Put()) == S_OK)
+    view->TranslateAccelerator(msg);
+  return CallNextHookEx(nullptr, code, wParam, lParam);
+}
 
 UINT_PTR CALLBACK OpenDialogHook(HWND hook, UINT message, WPARAM, LPARAM lParam) {
   if (message == WM_INITDIALOG) openDialog->hook = hook;
@@ -179,6 +192,14 @@ TEST(OpenDialogClient, ListsTheLevelsOpensOneAndTakesItsFileAsTheDefaultCommand)
     browsed = static_cast<HRESULT>(SendMessageW(run.hook, kBrowseTo, 0, reinterpret_cast<LPARAM>(folder.Get())));
     HWND list = DialogList(run.dialog, 3);
     rootRows = list ? ListRows(list) : rootRows;
+    // A Delete typed in the file-name box is the box's; the same key in the list deletes.
+    HWND name = reinterpret_cast<HWND>(SendMessageW(GetDlgItem(run.dialog, cmb13), CBEM_GETEDITCONTROL, 0, 0));
+    if (list) ListView_SetItemState(list, 2, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
+    SetWindowTextW(name, L"x");  // after the selection, which the dialog copies into the box
+    EXPECT_TRUE(name && Type(name, VK_DELETE, [&] { return ui::Text(name).empty(); })) << "the file-name box's";
+    EXPECT_EQ(sheet::StoredLevels().size(), 2u) << "a key of the file-name box deletes no level";
+    EXPECT_TRUE(list && Type(list, VK_DELETE, [] { return sheet::StoredLevels().size() == 1; })) << "the list's";
+    list = DialogList(run.dialog, 2);
     if (list) ActivateRow(list, 1);
     HWND levelList = DialogList(run.dialog, 1);
     levelRows = levelList ? ListRows(levelList) : levelRows;
@@ -192,7 +213,9 @@ TEST(OpenDialogClient, ListsTheLevelsOpensOneAndTakesItsFileAsTheDefaultCommand)
   ofn.nMaxFile = MAX_PATH;
   ofn.Flags = OFN_EXPLORER | OFN_ENABLEHOOK;
   ofn.lpfnHook = OpenDialogHook;
+  HHOOK keys = SetWindowsHookExW(WH_MSGFILTER, ViewKeysFirst, nullptr, GetCurrentThreadId());
   BOOL chosen = GetOpenFileNameW(&ofn);
+  UnhookWindowsHookEx(keys);
   person.join();
   openDialog = nullptr;
   EXPECT_EQ(browsed, S_OK);

@@ -105,7 +105,6 @@ STDMETHODIMP BrowserDouble::RemoveMenusSB(HMENU menu) noexcept {
 
 STDMETHODIMP BrowserDouble::GetViewStateStream(DWORD mode, IStream** result) noexcept {
   *result = nullptr;
-  if (!hasStream) return E_FAIL;
   if ((mode & STGM_WRITE) || !stream) CreateStreamOnHGlobal(nullptr, TRUE, stream.Put());
   LARGE_INTEGER zero{};
   stream->Seek(zero, STREAM_SEEK_SET, nullptr);

@@ -29,7 +29,6 @@ class BrowserDouble : public com::ComObject<IShellBrowser> {
   int reloads = 0;                   // the browser's own refresh, asked for by the view
   std::vector<WPARAM> commands;      // every other WM_COMMAND of the frame
   std::vector<std::wstring> status;  // "parts <count> <first width>" and each text of the status bar
-  bool hasStream = true;             // false: no view state stream
   com::ComPtr<IStream> stream;       // the view state; none until written or seeded
 
   void SeedMode(UINT mode);

@@ -1,14 +1,21 @@
 // Starting and ending the programs a test drives beside itself, with a deadline on each wait.
 #include "support/child_process.h"
 namespace child {
-Process::Process(const std::wstring& program, const std::vector<std::wstring>& arguments) {
+Process::Process(const std::wstring& program, const std::vector<std::wstring>& arguments, const std::wstring& output) {
   std::wstring command = L"\"" + program + L"\"";
   for (const std::wstring& argument : arguments)
     command += argument.find(L' ') == std::wstring::npos ? L" " + argument : L" \"" + argument + L"\"";
   STARTUPINFOW startup{sizeof(startup)};
+  SECURITY_ATTRIBUTES inherit{sizeof(inherit), nullptr, TRUE};
+  HANDLE file = output.empty() ? INVALID_HANDLE_VALUE
+                               : CreateFileW(output.c_str(), GENERIC_WRITE, FILE_SHARE_READ, &inherit, CREATE_ALWAYS, 0, nullptr);
+  const bool redirect = file != INVALID_HANDLE_VALUE;
+  if (redirect) startup.dwFlags = STARTF_USESTDHANDLES, startup.hStdOutput = startup.hStdError = file;
   PROCESS_INFORMATION info{};
-  if (!CreateProcessW(program.c_str(), command.data(), nullptr, nullptr, FALSE, 0, nullptr, nullptr, &startup, &info))
-    return;
+  const BOOL started = CreateProcessW(program.c_str(), command.data(), nullptr, nullptr, redirect, 0, nullptr, nullptr,
+                                      &startup, &info);
+  if (redirect) CloseHandle(file);
+  if (!started) return;
   CloseHandle(info.hThread);
   process_ = info.hProcess;
 }

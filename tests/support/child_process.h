@@ -5,10 +5,11 @@
 #include <vector>
 namespace child {
 // The program is started at construction with its arguments (quoted where they hold a blank),
-// the caller's environment and no window of its own; it is ended at destruction if still running.
+// the caller's environment and no window of its own, its output written to the file `output`
+// if one is named; it is ended at destruction if still running.
 class Process {
  public:
-  Process(const std::wstring& program, const std::vector<std::wstring>& arguments);
+  Process(const std::wstring& program, const std::vector<std::wstring>& arguments, const std::wstring& output = {});
   ~Process();
   Process(const Process&) = delete;
   Process& operator=(const Process&) = delete;

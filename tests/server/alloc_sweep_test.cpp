@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 #include <windows.h>
 #include <commctrl.h>
-#include <shlobj.h>
 #include <atomic>
 #include <cstdio>
 #include <functional>
@@ -15,6 +14,7 @@
 #include "shell/shell_test_util.h"
 #include "shell/shell_view.h"
 #include "store/station_record.h"
+#include "support/browser_double.h"
 #include "support/registry_sandbox.h"
 #include "transfer/data_object.h"
 namespace {
@@ -190,42 +190,6 @@ void DataObjectFormats() {
     formats->Release();
   }
 }
-// The least a browser must answer for a view to open in it; made with counting paused.
-class Browser : public com::ComObject<IShellBrowser> {
- public:
-  ~Browser() override { DestroyWindow(frame); }
-  HWND frame = CreateWindowExW(0, L"STATIC", nullptr, WS_OVERLAPPEDWINDOW, 0, 0, 400, 300, nullptr, nullptr, nullptr,
-                               nullptr);
-  STDMETHODIMP GetWindow(HWND* window) override { return *window = frame, S_OK; }
-  STDMETHODIMP ContextSensitiveHelp(BOOL) override { return E_NOTIMPL; }
-  int lent = 0;  // menus filled with this browser's popups and not given back
-  // As Explorer does: File, Edit and View popups for the view to add its entries to.
-  STDMETHODIMP InsertMenusSB(HMENU menu, LPOLEMENUGROUPWIDTHS) override {
-    ++lent;
-    for (UINT id : {FCIDM_MENU_FILE, FCIDM_MENU_EDIT, FCIDM_MENU_VIEW}) {
-      MENUITEMINFOW item{sizeof(item), MIIM_ID | MIIM_SUBMENU};
-      item.wID = id;
-      item.hSubMenu = CreatePopupMenu();
-      InsertMenuItemW(menu, GetMenuItemCount(menu), TRUE, &item);
-    }
-    return S_OK;
-  }
-  STDMETHODIMP SetMenuSB(HMENU, HOLEMENU, HWND) override { return S_OK; }
-  STDMETHODIMP RemoveMenusSB(HMENU) override { return --lent, S_OK; }
-  STDMETHODIMP SetStatusTextSB(LPCWSTR) override { return S_OK; }
-  STDMETHODIMP EnableModelessSB(BOOL) override { return S_OK; }
-  STDMETHODIMP TranslateAcceleratorSB(MSG*, WORD) override { return S_FALSE; }
-  STDMETHODIMP BrowseObject(PCUIDLIST_RELATIVE, UINT) override { return S_OK; }
-  STDMETHODIMP GetViewStateStream(DWORD, IStream** stream) override { return *stream = nullptr, E_FAIL; }
-  STDMETHODIMP GetControlWindow(UINT, HWND* window) override { return *window = nullptr, E_NOTIMPL; }
-  STDMETHODIMP SendControlMsg(UINT, UINT, WPARAM, LPARAM, LRESULT* result) override {
-    if (result) *result = 0;
-    return S_OK;
-  }
-  STDMETHODIMP QueryActiveShellView(IShellView** view) override { return *view = nullptr, E_NOTIMPL; }
-  STDMETHODIMP OnViewWindowActive(IShellView*) override { return S_OK; }
-  STDMETHODIMP SetToolbarItems(LPTBBUTTONSB, UINT, UINT) override { return S_OK; }
-};
 // A person dismissing each dialog as it comes up: Cancel on a sheet, Close on a message box.
 // The hook runs on the thread that shows it and posts only, so it makes no allocation the sweep counts.
 LRESULT CALLBACK Dismiss(int code, WPARAM wParam, LPARAM lParam) {
@@ -261,7 +225,7 @@ void DownloadCancelled() {
 // filled, the menus of its activation, a copy of a level, its paste, a refill by the Details
 // command and the level's property sheet.
 void View(bool fill, bool use = false) {
-  com::ComPtr<Browser> browser = Unswept([] { return com::Make<Browser>(); });
+  com::ComPtr<BrowserDouble> browser = Unswept([] { return com::Make<BrowserDouble>(); });
   everyThread = fill;
   if (auto root = Root()) {
     IShellView* view = nullptr;
@@ -275,7 +239,7 @@ void View(bool fill, bool use = false) {
       if (view->CreateViewWindow(nullptr, &settings, browser.Get(), &box, &window) == S_OK) {
         HWND list = FindWindowExW(window, nullptr, WC_LISTVIEWW, nullptr);
         const auto filled = [&] {
-          return PumpUntil([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); }, 5000);
+          return ui::PumpFor([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); }, 5000);
         };
         EXPECT_TRUE(!fill || filled()) << "the clip still plays";
         if (use) {
@@ -308,7 +272,7 @@ void View(bool fill, bool use = false) {
   everyThread = false;
   browser.Reset();
   // Messages go on being handled until the view's worker has let go of the module.
-  PumpUntil([] { return com::ModuleLockCount() == 0; }, 5000);
+  ui::PumpFor([] { return com::ModuleLockCount() == 0; }, 5000);
 }
 void Registration() {
   CServerModule server;

@@ -86,7 +86,7 @@ class DropOnRootView : public testing::Test {
   // report and, in `seen`, the selection once the pointer rests on the row.
   std::string DragOnto(int row, const std::wstring& items, std::vector<int>& seen) {
     Peer peer({L"drag", L"500", L"20", L"30", items});
-    if (!PumpUntil([&] { return peer.Output().find("ready") != std::string::npos; }, 20000)) return "peer not ready";
+    if (!ui::PumpFor([&] { return peer.Output().find("ready") != std::string::npos; }, 20000)) return "peer not ready";
     std::atomic<bool> resting{false}, release{false};
     POINT to = RowPoint(row);
     std::thread hand([&] {
@@ -102,10 +102,10 @@ class DropOnRootView : public testing::Test {
       ui::WaitFor([&] { return release.load(); });
       ui::Mouse(MOUSEEVENTF_LEFTUP, to);
     });
-    PumpUntil([&] { return resting && Selected() == std::vector<int>{row}; }, 5000);
+    ui::PumpFor([&] { return resting && Selected() == std::vector<int>{row}; }, 5000);
     seen = Selected();
     release = true;
-    PumpUntil([&] { return peer.process.ExitCode() != child::Process::kNotEnded; }, 20000);
+    ui::PumpFor([&] { return peer.process.ExitCode() != child::Process::kNotEnded; }, 20000);
     hand.join();
     return peer.Output();
   }

@@ -161,7 +161,7 @@ UINT_PTR CALLBACK OpenDialogHook(HWND hook, UINT message, WPARAM, LPARAM lParam)
 // The view the dialog shows, once filled with `rows` rows.
 HWND DialogList(HWND dialog, size_t rows) {
   HWND list = nullptr;
-  PumpUntil([&] {
+  ui::PumpFor([&] {
     HWND view = FindWindowExW(dialog, nullptr, L"TSViewNSClass", nullptr);
     list = view ? GetDlgItem(view, 2000) : nullptr;
     return list && !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr) && ListRows(list).size() == rows;
@@ -187,7 +187,7 @@ TEST(OpenDialogClient, ListsTheLevelsOpensOneAndTakesItsFileAsTheDefaultCommand)
   std::vector<std::wstring> rootRows, levelRows;
   HRESULT browsed = E_PENDING;
   std::thread person([&] {
-    PumpUntil([&] { return run.dialog.load() != nullptr; });
+    ui::PumpFor([&] { return run.dialog.load() != nullptr; });
     if (!run.dialog) return;
     browsed = static_cast<HRESULT>(SendMessageW(run.hook, kBrowseTo, 0, reinterpret_cast<LPARAM>(folder.Get())));
     HWND list = DialogList(run.dialog, 3);
@@ -204,7 +204,7 @@ TEST(OpenDialogClient, ListsTheLevelsOpensOneAndTakesItsFileAsTheDefaultCommand)
     HWND levelList = DialogList(run.dialog, 1);
     levelRows = levelList ? ListRows(levelList) : levelRows;
     if (levelList) ActivateRow(levelList, 0);
-    PumpUntil([&] { return run.fileOk > 0 || !IsWindow(run.dialog); }, 3000);
+    ui::PumpFor([&] { return run.fileOk > 0 || !IsWindow(run.dialog); }, 3000);
     if (IsWindow(run.dialog)) PostMessageW(run.dialog, WM_COMMAND, IDCANCEL, 0);
   });
   wchar_t file[MAX_PATH] = {};

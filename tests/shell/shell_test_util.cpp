@@ -44,15 +44,6 @@ std::wstring Name(IShellFolder* folder, LPCITEMIDLIST item, SHGDNF flags, HRESUL
   return win::UniqueCoMem<wchar_t>(strret.pOleStr).Get();
 }
 
-bool PumpUntil(const std::function<bool()>& done, DWORD milliseconds) {
-  for (DWORD start = GetTickCount(); !done();) {
-    if (GetTickCount() - start > milliseconds) return false;
-    MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT);
-    for (MSG msg; PeekMessageW(&msg, nullptr, 0, 0, PM_REMOVE);) DispatchMessageW(&msg);
-  }
-  return true;
-}
-
 com::ComPtr<IExplorerBrowser> BrowseToFolder(HWND frame, RECT rect) {
   com::ComPtr<IExplorerBrowser> browser;
   FOLDERSETTINGS settings{FVM_DETAILS, 0};
@@ -70,7 +61,7 @@ HWND CurrentList(IExplorerBrowser* browser) {
   HWND window = nullptr;
   if (FAILED(browser->GetCurrentView(IID_IShellView, view.PutVoid())) || FAILED(view->GetWindow(&window))) return nullptr;
   HWND list = GetDlgItem(window, 2000);
-  EXPECT_TRUE(PumpUntil([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); })) << "filled";
+  EXPECT_TRUE(ui::PumpFor([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); })) << "filled";
   return list;
 }
 

@@ -2,7 +2,6 @@
 #pragma once
 #include <windows.h>
 #include <shlobj.h>
-#include <functional>
 #include <string>
 #include <vector>
 #include "base/win_handles.h"
@@ -24,8 +23,6 @@ std::vector<UniqueList> Drain(IEnumIDList* list);  // checks the last Next repor
 com::ComPtr<IShellFolder> Bind(IShellFolder* parent, LPCITEMIDLIST item);
 // A display name, which must come as a wide string; "<failed>" if the call fails.
 std::wstring Name(IShellFolder* folder, LPCITEMIDLIST item, SHGDNF flags, HRESULT* hr = nullptr);
-// Dispatches this thread's messages until `done` holds or `milliseconds` pass.
-bool PumpUntil(const std::function<bool()>& done, DWORD milliseconds = 10000);
 // Wine's ExplorerBrowser in `frame`, in Details, moved to the registered folder; null on failure.
 com::ComPtr<IExplorerBrowser> BrowseToFolder(HWND frame, RECT rect);
 // The list of the browser's current view, once its thread has filled it.

@@ -41,7 +41,7 @@ HWND AnimationOf(HWND view) { return FindWindowExW(ListOf(view), nullptr, ANIMAT
 Texts Rows(HWND view, bool images = false) { return ListRows(ListOf(view), images); }
 void Select(HWND view, int row) { ListView_SetItemState(ListOf(view), row, LVIS_SELECTED, LVIS_SELECTED); }
 
-void Refilled(HWND view) { EXPECT_TRUE(PumpUntil([&] { return !AnimationOf(view) && !Rows(view).empty(); })); }
+void Refilled(HWND view) { EXPECT_TRUE(ui::PumpFor([&] { return !AnimationOf(view) && !Rows(view).empty(); })); }
 
 // A root folder over a store of three levels; every view made is closed, every merged menu
 // given back and every object let go by the end.
@@ -59,7 +59,7 @@ class View : public ::testing::Test {
     EXPECT_EQ(browser_->lent, 0) << "every merged menu given back to the browser";
     browser_.Reset();
     root_.Reset();
-    EXPECT_TRUE(PumpUntil([&] { return com::ModuleLockCount() == before_; })) << "every object let go";
+    EXPECT_TRUE(ui::PumpFor([&] { return com::ModuleLockCount() == before_; })) << "every object let go";
   }
 
   // `view` in `browser`, created and, unless told not to, filled.
@@ -71,7 +71,7 @@ class View : public ::testing::Test {
     EXPECT_EQ(view->CreateViewWindow(previous, &settings, browser ? browser : browser_.Get(), &rect, &window), S_OK);
     views_.emplace_back(view);
     if (window && wait) {
-      EXPECT_TRUE(PumpUntil([&] { return !AnimationOf(window); })) << "the list is filled";
+      EXPECT_TRUE(ui::PumpFor([&] { return !AnimationOf(window); })) << "the list is filled";
     }
     return window;
   }
@@ -113,7 +113,7 @@ TEST_F(View, ModesChangeTheListAndOnlyDetailsEnumeratesAgain) {
   EXPECT_FALSE(AnimationOf(view));
   Command(view, kCmdDetails);
   EXPECT_TRUE(AnimationOf(view)) << "Details enumerates again";
-  ASSERT_TRUE(PumpUntil([&] { return !AnimationOf(view); }));
+  ASSERT_TRUE(ui::PumpFor([&] { return !AnimationOf(view); }));
   EXPECT_EQ(Rows(view), kRootRows);
   const std::wstring level = std::to_wstring(IMAGE_LEVEL);
   EXPECT_EQ(Rows(view, true), (Texts{std::to_wstring(IMAGE_ADD_LEVEL), level, level, level}));
@@ -165,7 +165,7 @@ TEST_F(View, ARefreshWhileTheThreadRunsShowsWhatCameMeanwhile) {
   ASSERT_TRUE(ui::WaitFor([&] { return PeekMessageW(&posted, view, GetEnumIDListMessage, GetEnumIDListMessage, PM_NOREMOVE); }));
   SeedLevel(3, L"Delta");
   EXPECT_EQ(Last()->Refresh(), S_OK);
-  ASSERT_TRUE(PumpUntil([&] { return !AnimationOf(view); }));
+  ASSERT_TRUE(ui::PumpFor([&] { return !AnimationOf(view); }));
   EXPECT_EQ(Rows(view), (Texts{L"Add New Digital Level", L"alpha", L"Bravo", L"Charlie", L"Delta"}));
 }
 
@@ -193,7 +193,7 @@ TEST_F(View, AThousandViewsOpenedFilledAndClosedLeaveNothingBehind) {
     Last()->DestroyViewWindow();
     views_.resize(1);
   }
-  ASSERT_TRUE(PumpUntil([&] { return com::ModuleLockCount() == start.locks && ThreadCount() <= start.threads; }));
+  ASSERT_TRUE(ui::PumpFor([&] { return com::ModuleLockCount() == start.locks && ThreadCount() <= start.threads; }));
   const Resources end;
   EXPECT_LE(end.handles, start.handles + 5) << "kernel handles";
   EXPECT_EQ(end.windows, start.windows) << "windows";
@@ -295,12 +295,12 @@ TEST_F(View, DeleteAndPasteInALevelsViewChangeNothingYetEveryViewOfALevelReloads
   Command(first, kCmdPaste);
   OleSetClipboard(nullptr);
   EXPECT_EQ(Stored(), (Texts{L"Bravo", L"Charlie", L"alpha"})) << "levels are deleted and pasted in the root only";
-  EXPECT_TRUE(PumpUntil([&] { return secondBrowser->reloads == 2; })) << "each change heard by the other view";
+  EXPECT_TRUE(ui::PumpFor([&] { return secondBrowser->reloads == 2; })) << "each change heard by the other view";
   Refilled(second);
   EXPECT_EQ(rootBrowser->reloads, 0) << "the root view hears only changes of the root";
 }
 
-// The entries and states a user sees as each popup opens, and an entry chosen on the bar runs.
+// The entries and states a user sees as each popup opens.
 TEST_F(View, MergedMenuStatesAreFreshAtEachOpening) {
   HWND view = Open(root_.Get());
   ParkCursorAwayFrom(view);
@@ -313,8 +313,7 @@ TEST_F(View, MergedMenuStatesAreFreshAtEachOpening) {
   POINT over{row.left + 5, (row.top + row.bottom) / 2};
   ClientToScreen(ListOf(view), &over);
   SetCursorPos(over.x, over.y);
-  const UINT list = GetMenuItemID(GetSubMenu(browser_->shown, 2), 4);
-  SendMessageW(browser_->frame, WM_COMMAND, list, 0);  // chosen on the bar
+  Command(view, kCmdList);
   EXPECT_EQ(Mode(), UINT{FVM_LIST});
   EXPECT_EQ(browser_->Popup(FCIDM_MENU_EDIT).at(1), L"&Copy") << "a mode change rebuilds too";
   EXPECT_EQ(browser_->Popup(FCIDM_MENU_VIEW).at(4), L"List checked");
@@ -344,6 +343,45 @@ bool Has(const Texts& entries, const wchar_t* entry) {
   return std::find(entries.begin(), entries.end(), entry) != entries.end();
 }
 
+// A person opens File, Edit and View on the frame's bar with the mouse: the menu loop shows
+// each popup with the view's entries, and the one chosen runs.
+TEST_F(View, EachMenuOpensWithTheViewsEntriesAndRunsWhatIsChosen) {
+  HWND view = Open(root_.Get());
+  SetWindowPos(browser_->frame, HWND_TOPMOST, 0, 0, 600, 400, SWP_SHOWWINDOW);
+  ASSERT_EQ(Last()->UIActivate(SVUIA_ACTIVATE_FOCUS), S_OK);
+  const auto choose = [&](int popup, UINT id) {
+    std::atomic<bool> done{false};
+    std::thread person([&] {
+      RECT box{};
+      GetMenuItemRect(browser_->frame, GetMenu(browser_->frame), popup, &box);
+      ui::Click({(box.left + box.right) / 2, (box.top + box.bottom) / 2});
+      const bool shown = ui::WaitFor([&] {
+        HMENU menu = reinterpret_cast<HMENU>(SendMessageW(FindWindowW(L"#32768", nullptr), MN_GETHMENU, 0, 0));
+        for (int i = 0; menu && i < GetMenuItemCount(menu); ++i)  // the rectangle only once it is shown
+          if (GetMenuItemID(menu, i) == id) return GetMenuItemRect(nullptr, menu, i, &box) != FALSE;
+        return false;
+      });
+      if (shown) ui::Click({(box.left + box.right) / 2, (box.top + box.bottom) / 2});
+      else PostMessageW(browser_->frame, WM_CANCELMODE, 0, 0);  // ends the menu loop a failed choice left open
+      done = true;
+    });
+    ui::PumpFor([&] { return done.load(); }, 15000);
+    person.join();
+  };
+  Select(view, 1);
+  Command(view, kCmdCopy);
+  choose(1, kCmdPaste);
+  EXPECT_TRUE(ui::PumpFor([] { return Stored() == Texts{L"Bravo", L"Charlie", L"Copy of alpha", L"alpha"}; }))
+      << "Edit, Paste";
+  Refilled(view);
+  choose(2, kCmdLargeIcons);
+  EXPECT_TRUE(ui::PumpFor([&] { return Mode() == 1u; })) << "View, Large Icons";
+  Select(view, 3);
+  choose(0, kCmdDelete);
+  EXPECT_TRUE(ui::PumpFor([] { return Stored() == Texts{L"Bravo", L"Copy of alpha", L"alpha"}; })) << "File, Delete";
+  OleSetClipboard(nullptr);
+}
+
 TEST_F(View, ContextMenuOffersModesOnlyOnEmptySpaceAndLevelCommandsOnlyForALevel) {
   HWND view = Open(root_.Get());
   ParkCursorAwayFrom(view);
@@ -363,14 +401,14 @@ struct Peer {
   explicit Peer(const std::wstring& store)
       : process((SetEnvironmentVariableW(L"MARLIX_VIEW_PEER_STORE", store.c_str()), child::SelfPath()),
                 {L"--gtest_also_run_disabled_tests", L"--gtest_filter=View.DISABLED_Peer"}) {
-    PumpUntil([&] {
+    ui::PumpFor([&] {
       root = FindWindowW(BrowserDouble::kClass, L"peer root");
       return root && RootRows() == 4;
     }, 30000);
   }
   ~Peer() {
     PostMessageW(root, WM_COMMAND, IDCLOSE, 0);
-    PumpUntil([&] { return process.ExitCode() != child::Process::kNotEnded; }, 20000);
+    ui::PumpFor([&] { return process.ExitCode() != child::Process::kNotEnded; }, 20000);
     EXPECT_EQ(process.ExitCode(), 0u) << "the peer's own checks";
   }
   HWND RootView() const { return FindWindowExW(root, nullptr, kViewWindowClass, nullptr); }
@@ -390,7 +428,7 @@ TEST_F(View, DISABLED_Peer) {
   Open(root_.Get());
   SetWindowTextW(browser_->frame, L"peer root");
   const auto& commands = browser_->commands;
-  EXPECT_TRUE(PumpUntil([&] { return std::count(commands.begin(), commands.end(), WPARAM{IDCLOSE}) > 0; }, 60000));
+  EXPECT_TRUE(ui::PumpFor([&] { return std::count(commands.begin(), commands.end(), WPARAM{IDCLOSE}) > 0; }, 60000));
   for (auto& view : views_) view->DestroyViewWindow();
   views_.clear();
   RegOverridePredefKey(HKEY_CURRENT_USER, nullptr);
@@ -408,16 +446,16 @@ TEST_F(View, AnotherProcessSeesChangesByTheBroadcastAloneAndPastesWhatWasCopiedH
   ASSERT_EQ(peer.RootRows(), 4);
   Select(view, 3);
   Command(view, kCmdDelete);
-  EXPECT_TRUE(PumpUntil([&] { return peer.RootRows() == 3; })) << "deleted here, gone there";
+  EXPECT_TRUE(ui::PumpFor([&] { return peer.RootRows() == 3; })) << "deleted here, gone there";
   AnswerSheets([&] { Command(view, kCmdNewLevel); }, {IDOK});
-  EXPECT_TRUE(PumpUntil([&] { return peer.RootRows() == 4; })) << "created here, shown there";
+  EXPECT_TRUE(ui::PumpFor([&] { return peer.RootRows() == 4; })) << "created here, shown there";
   Refilled(view);
   Select(view, 1);
   Command(view, kCmdCopy);
   PostMessageW(peer.RootView(), WM_COMMAND, kCmdPaste, 0);
-  EXPECT_TRUE(PumpUntil([&] { return peer.RootRows() == 5 && Rows(view).size() == 5; })) << "pasted there, shown here";
+  EXPECT_TRUE(ui::PumpFor([&] { return peer.RootRows() == 5 && Rows(view).size() == 5; })) << "pasted there, shown here";
   PostMessageW(peer.RootView(), WM_COMMAND, kCmdPaste, 0);
-  EXPECT_TRUE(PumpUntil([&] { return Rows(view).size() == 6; }));
+  EXPECT_TRUE(ui::PumpFor([&] { return Rows(view).size() == 6; }));
   auto levels = sheet::StoredLevels();
   for (const wchar_t* copy : {L"Copy of alpha|5|4800|1|2|8|0|1|north line|HRB1X",
                               L"Copy of Copy of alpha|5|4800|1|2|8|0|1|north line|HRB1X"})

@@ -6,7 +6,8 @@
 
 namespace {
 // A popup `id` of the menu bar, as a browser merges its own; "-" is a separator.
-void AddPopup(HMENU bar, UINT id, const wchar_t* title, std::vector<std::pair<UINT, const wchar_t*>> entries) {
+using Entries = std::initializer_list<std::pair<UINT, const wchar_t*>>;  // no allocation: the sweep fails those
+void AddPopup(HMENU bar, UINT id, const wchar_t* title, Entries entries) {
   HMENU popup = CreatePopupMenu();
   for (auto [entryId, text] : entries) {
     MENUITEMINFOW item{sizeof(item), MIIM_ID | MIIM_FTYPE | MIIM_STRING};
@@ -20,6 +21,14 @@ void AddPopup(HMENU bar, UINT id, const wchar_t* title, std::vector<std::pair<UI
   item.hSubMenu = popup;
   item.dwTypeData = const_cast<wchar_t*>(title);
   InsertMenuItemW(bar, GetMenuItemCount(bar), TRUE, &item);
+}
+// Kept where memory allows: the allocation sweep fails this process's allocations too.
+template <class T, class Make>
+void Record(std::vector<T>& record, Make make) noexcept {
+  try {
+    record.push_back(make());
+  } catch (...) {
+  }
 }
 }  // namespace
 
@@ -55,7 +64,7 @@ LRESULT CALLBACK BrowserDouble::FrameProc(HWND window, UINT message, WPARAM wPar
   const bool viewsCommand = message == WM_COMMAND && wParam >= kCmdNewLevel && wParam <= kCmdActivate;
   if (self->active_ && (message == WM_INITMENUPOPUP || viewsCommand))
     return SendMessageW(self->active_, message, wParam, lParam);
-  if (message == WM_COMMAND) self->commands.push_back(wParam);
+  if (message == WM_COMMAND) Record(self->commands, [&] { return wParam; });
   if (message == WM_COMMAND && wParam == kCmdBrowserRefresh) ++self->reloads;
   return DefWindowProcW(window, message, wParam, lParam);
 }
@@ -113,9 +122,10 @@ STDMETHODIMP BrowserDouble::GetViewStateStream(DWORD mode, IStream** result) noe
 
 STDMETHODIMP BrowserDouble::SendControlMsg(UINT id, UINT message, WPARAM wParam, LPARAM lParam,
                                            LRESULT* result) noexcept {
-  if (id == FCW_STATUS && message == SB_SETPARTS)
-    status.push_back(L"parts " + std::to_wstring(wParam) + L" " + std::to_wstring(reinterpret_cast<int*>(lParam)[0]));
-  if (id == FCW_STATUS && message == SB_SETTEXTW) status.push_back(reinterpret_cast<const wchar_t*>(lParam));
+  const auto parts = [&] { return L"parts " + std::to_wstring(wParam) + L" " + std::to_wstring(*reinterpret_cast<int*>(lParam)); };
+  const auto text = [&] { return std::wstring(reinterpret_cast<LPCWSTR>(lParam)); };
+  if (id == FCW_STATUS && message == SB_SETPARTS) Record(status, parts);
+  if (id == FCW_STATUS && message == SB_SETTEXTW) Record(status, text);
   if (result) *result = 0;
   return S_OK;
 }

@@ -38,7 +38,6 @@ void WriteBlanks(HANDLE target, size_t count) {
   }
 }
 
-
 }  // namespace
 
 std::string FormatTextV(const char* format, va_list args) { return format_detail::FormatV(format, args); }

@@ -15,9 +15,6 @@
 
 namespace sheet {
 
-using ui::OwnedDialog;
-using ui::Text;
-using ui::WaitFor;
 using Strings = std::vector<std::wstring>;
 
 // The page window at `index`, null while the page was never shown.
@@ -25,7 +22,6 @@ inline HWND Page(HWND sheet, int index) {
   return reinterpret_cast<HWND>(SendMessageW(sheet, PSM_INDEXTOHWND, static_cast<WPARAM>(index), 0));
 }
 inline void ShowTab(HWND sheet, int index) { SendMessageW(sheet, PSM_SETCURSEL, static_cast<WPARAM>(index), 0); }
-inline void Press(HWND sheet, int id) { user::Click(sheet, id); }
 inline bool ApplyEnabled(HWND sheet) { return IsWindowEnabled(GetDlgItem(sheet, 12321)) != FALSE; }
 // Replaces the edit's text key by key; L"\b" is a backspace over all it held.
 inline void Type(HWND page, int id, const std::wstring& text) { ui::Type(GetDlgItem(page, id), text.c_str()); }

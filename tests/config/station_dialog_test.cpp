@@ -6,9 +6,10 @@
 
 #include "config/sheet_driver.h"
 #include "helpers/app_helpers.h"
-#include "helpers/test_files.h"
+#include "support/test_files.h"
 
 using namespace sheet;
+using namespace ui;
 using user::Box;
 using user::ReadBox;
 
@@ -96,7 +97,7 @@ TEST_F(StationSheet, NewLevelShowsTheDefaultsAndStoresEveryCodeUnderADecimalComm
     Pick(advanced, 218, L"Xon/Xoff");
     Pick(advanced, 219, L"Not set");
     EXPECT_FALSE(ApplyEnabled(sheet)) << "a new level has no Apply";
-    Press(sheet, IDOK);
+    user::Click(sheet, IDOK);
   }), IDOK);
   _wsetlocale(LC_ALL, L"C");
   EXPECT_EQ(StoredLevels(), Strings{L"North|10|115200|15|1|7|1|0|tripod 4|HRB1X"});
@@ -118,7 +119,7 @@ TEST_F(StationSheet, RefusedNamesKeepTheSheetOpenAndTheStoreUntouched) {
         {L"Level", L"The digital level 'Level' already exists"}};
     for (const auto& [name, message] : cases) {
       Type(general, 203, name.empty() ? L"\b" : name);
-      Press(sheet, IDOK);
+      user::Click(sheet, IDOK);
       EXPECT_EQ(ReadBox(sheet), Refusal(message));
       EXPECT_EQ(StoredLevels(), before);
     }
@@ -126,7 +127,7 @@ TEST_F(StationSheet, RefusedNamesKeepTheSheetOpenAndTheStoreUntouched) {
     EXPECT_EQ(Text(general, 204).size(), kMaxStationTextLength) << "a note the store can read back";
     Type(general, 203, std::wstring(300, L'l'));
     EXPECT_EQ(Text(general, 203).size(), kMaxStationNameLength) << "a name every road can carry";
-    Press(sheet, IDOK);
+    user::Click(sheet, IDOK);
   }), IDOK);
   EXPECT_EQ(StoredLevels().size(), 2u);
 }
@@ -142,7 +143,7 @@ TEST_F(StationSheet, AnOkStoresBackWhatTheSheetCouldNotShow) {
     EXPECT_FALSE(ApplyEnabled(sheet)) << "nothing changed yet";
     Type(Page(sheet, 0), 204, L"new");
     EXPECT_TRUE(ApplyEnabled(sheet));
-    Press(sheet, IDOK);
+    user::Click(sheet, IDOK);
   }), IDOK);
   EXPECT_EQ(StoredLevels(), Strings{L"Odd|1|7|0|7|5|3|9|new|HRA20"}) << "the page never opened keeps its codes";
 }
@@ -160,7 +161,7 @@ TEST_F(StationSheet, StoredValuesShowAsTheListsOfferThem) {
     EXPECT_EQ(Selected(advanced, 209), L"Odd");
     EXPECT_EQ(Selected(advanced, 211), L"1.5");
     EXPECT_EQ(Selected(advanced, 218), L"Xon/Xoff");
-    Press(sheet, IDOK);
+    user::Click(sheet, IDOK);
   }), IDOK);
   EXPECT_EQ(StoredLevels(), Strings{L"Twelve|0|1200|15|2|8|1|1||"});
 }
@@ -170,13 +171,13 @@ TEST_F(StationSheet, ARenameMakesNoTwinAndLaterSavesFollowTheNewName) {
   Stored(L"Other");
   EXPECT_EQ(RunSheet(level, false, [](HWND sheet) {
     Type(Page(sheet, 0), 203, L"Other");
-    Press(sheet, 12321);
+    user::Click(sheet, 12321);
     EXPECT_EQ(ReadBox(sheet), Refusal(L"The digital level 'Other' already exists"));
     Type(Page(sheet, 0), 203, L"B");
-    Press(sheet, 12321);
+    user::Click(sheet, 12321);
     EXPECT_TRUE(WaitFor([] { return StoredLevels()[0] == L"B|1|9600|1|0|8|0|1|first|HRA20"; }));
     Type(Page(sheet, 0), 204, L"second");
-    Press(sheet, IDOK);
+    user::Click(sheet, IDOK);
   }), IDOK);
   EXPECT_EQ(StoredLevels(), (Strings{L"B|1|9600|1|0|8|0|1|second|HRA20", L"Other|1|9600|1|0|8|0|1||HRA20"}));
 }
@@ -189,7 +190,7 @@ TEST_F(StationSheet, DISABLED_GermanTextsAndEntriesKeepTheirCodes) {
     EXPECT_EQ(Text(sheet), L"Eigenschaften des Digitalnivelliers");
     EXPECT_EQ(Text(Page(sheet, 0), 312), L"Anschluss:");
     Type(Page(sheet, 0), 203, L"\b");
-    Press(sheet, IDOK);
+    user::Click(sheet, IDOK);
     EXPECT_EQ(ReadBox(sheet).text, L"Bitte einen gültigen Gerätenamen eingeben!");
     Type(Page(sheet, 0), 203, L"Nord");
     ShowTab(sheet, 1);
@@ -200,7 +201,7 @@ TEST_F(StationSheet, DISABLED_GermanTextsAndEntriesKeepTheirCodes) {
     Pick(advanced, 209, L"Gerade");
     Pick(advanced, 219, L"Ein");
     Pick(advanced, 218, L"Keine");
-    Press(sheet, IDOK);
+    user::Click(sheet, IDOK);
   }), IDOK);
   EXPECT_EQ(StoredLevels(), Strings{L"Nord|3|9600|1|1|8|0|1||HRA20"});
 }
@@ -244,6 +245,6 @@ TEST_F(StationSheet, DISABLED_Screenshots) {
     EXPECT_TRUE(SaveScreenshot(window, prefix + L"-general.bmp"));
     ShowTab(window, 1);
     EXPECT_TRUE(SaveScreenshot(window, prefix + L"-advanced.bmp"));
-    Press(window, IDCANCEL);
+    user::Click(window, IDCANCEL);
   });
 }

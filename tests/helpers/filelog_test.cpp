@@ -8,7 +8,7 @@
 #include "base/boundary.h"
 #include "helpers/filelog.h"
 #include "helpers/stack_dump.h"
-#include "test_files.h"
+#include "support/test_files.h"
 using namespace kld::ft;
 namespace {
 std::wstring LogPath() {

@@ -3,7 +3,7 @@
 #include "helpers/error_reporter.h"
 #include "helpers/file_helpers.h"
 #include "helpers/path_parts.h"
-#include "test_files.h"
+#include "support/test_files.h"
 using namespace kld::ft;
 namespace {
 HRESULT Code(unsigned long value) { return static_cast<HRESULT>(value); }

@@ -7,7 +7,7 @@
 #include "helpers/translate_file.h"
 #include "helpers/translate_manager.h"
 #include "base/module_instance.h"
-#include "test_files.h"
+#include "support/test_files.h"
 using namespace kld::ft;
 namespace {
 constexpr LANGID kEnglish = 1033, kGerman = 1031, kFrench = 1036;

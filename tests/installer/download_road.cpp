@@ -5,7 +5,7 @@
 // instructions, Start is pressed and the practice instrument sends its job.
 // Every action is real mouse input or a key typed into a control, from a second thread
 // while this one runs the browser; nothing of ours stands between the steps.
-//   download_road <shell_peer.exe> <receiving folder> <screenshot folder>
+//   download_road <shell_peer.exe> <receiving folder> <screenshot folder> [pause ms before each step]
 // Says each step on the terminal, saves a picture of the screen after each (BMP), and
 // exits 0 only if the job arrived whole and no temporary file stayed behind.
 #include <windows.h>
@@ -13,31 +13,33 @@
 #include <shellapi.h>
 #include <shlobj.h>
 
+#include <algorithm>
 #include <atomic>
 #include <set>
 #include <cstdio>
-#include <functional>
 #include <string>
 #include <thread>
 #include <vector>
 
 #include "base/resource_ids.h"
+#include "shell/shell_test_util.h"
 #include "support/child_process.h"
-#include "support/window_waits.h"
+#include "support/test_files.h"
 #include "store/string_table.h"
 #include "transfer/data_test_support.h"
 
 namespace {
 
-const wchar_t kFolder[] = L"::{20D04FE0-3AEA-1069-A2D8-08002B30309D}\\::{7F0C89F4-CE25-42b8-918B-4118CE2CC5DF}";
 const wchar_t kLevel[] = L"Road Level";
 std::wstring g_shots;
 int g_shot = 0;
 int g_failures = 0;
 
+DWORD g_pause = 0;  // for a person following the demo
 void Say(const char* text) {
   std::printf("road: %s\n", text);
   std::fflush(stdout);
+  Sleep(g_pause);
 }
 void Check(bool ok, const char* what) {
   if (!ok) std::printf("FAIL: %s\n", what), ++g_failures;
@@ -58,34 +60,19 @@ void Shot(const wchar_t* name) {
                         DWORD(sizeof(BITMAPFILEHEADER) + sizeof(header))};
   wchar_t path[MAX_PATH];
   swprintf(path, MAX_PATH, L"%ls\\%02d-%ls.bmp", g_shots.c_str(), ++g_shot, name);
-  if (FILE* out = _wfopen(path, L"wb")) {
-    std::fwrite(&file, sizeof(file), 1, out);
-    std::fwrite(&header, sizeof(header), 1, out);
-    std::fwrite(bits, 1, size, out);
-    std::fclose(out);
-  }
+  testfiles::WriteBytes(path, std::string(reinterpret_cast<const char*>(&file), sizeof(file)) +
+                                  std::string(reinterpret_cast<const char*>(&header), sizeof(header)) +
+                                  std::string(static_cast<const char*>(bits), size));
   SelectObject(memory, old);
   DeleteObject(bitmap);
   DeleteDC(memory);
   ReleaseDC(nullptr, screen);
 }
 
-// The list of the browser's current view.
-HWND CurrentList(IExplorerBrowser* browser) {
-  IShellView* view = nullptr;
-  HWND window = nullptr;
-  if (FAILED(browser->GetCurrentView(IID_IShellView, reinterpret_cast<void**>(&view)))) return nullptr;
-  view->GetWindow(&window);
-  view->Release();
-  return GetDlgItem(window, 2000);
-}
-int RowOf(HWND list, const wchar_t* text) {
-  for (int row = 0; row < ListView_GetItemCount(list); ++row) {
-    wchar_t shown[MAX_PATH] = {};
-    ListView_GetItemText(list, row, 0, shown, MAX_PATH);
-    if (std::wstring(shown) == text) return row;
-  }
-  return -1;
+int RowOf(HWND list, const wchar_t* text) {  // -1 if no row shows it
+  const std::vector<std::wstring> rows = ListRows(list);
+  const auto row = std::find(rows.begin(), rows.end(), text);
+  return row == rows.end() ? -1 : static_cast<int>(row - rows.begin());
 }
 POINT RowPoint(HWND list, int row) {
   RECT rect{LVIR_LABEL};
@@ -99,19 +86,10 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
   const std::set<std::wstring> temporaryBefore = TransferFiles();
   HWND frame = CreateWindowExW(0, L"STATIC", L"Marlix Digital Levels", WS_POPUP | WS_VISIBLE | WS_BORDER, 0, 0, 600,
                                420, nullptr, nullptr, nullptr, nullptr);
-  IExplorerBrowser* browser = nullptr;
-  if (FAILED(CoCreateInstance(CLSID_ExplorerBrowser, nullptr, CLSCTX_INPROC_SERVER, IID_IExplorerBrowser,
-                              reinterpret_cast<void**>(&browser))))
-    return Say("no ExplorerBrowser"), 1;
-  RECT rect{0, 0, 600, 420};
-  FOLDERSETTINGS settings{FVM_DETAILS, 0};
-  browser->Initialize(frame, &rect, &settings);
-
   Say("1. Wine's ExplorerBrowser opens My Computer\\Marlix Digital Levels");
-  LPITEMIDLIST folder = nullptr;
-  Check(SHParseDisplayName(kFolder, nullptr, &folder, 0, nullptr) == S_OK, "the folder's address parses");
-  Check(browser->BrowseToIDList(folder, SBSP_ABSOLUTE) == S_OK, "the browser opens the folder");
-  CoTaskMemFree(folder);
+  com::ComPtr<IExplorerBrowser> owner = BrowseToFolder(frame, {0, 0, 600, 420});
+  if (!owner) return Say("the browser cannot open the folder"), 1;
+  IExplorerBrowser* browser = owner.Get();
   HWND root = nullptr;
   Check(ui::PumpFor([&] { return (root = CurrentList(browser)) && RowOf(root, L"Add New Digital Level") == 0; }),
         "the root lists the add row first");
@@ -195,16 +173,12 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
         "the dialog shows the instructions of the level's model");
   Check(code == 0, "the receiver wrote every file it was offered");
   Say("7. The practice instrument's job lies in the receiving folder as file1.tkf");
-  std::vector<char> job;
-  if (FILE* in = _wfopen((receiving + L"\\file1.tkf").c_str(), L"rb")) {
-    for (int c; (c = std::fgetc(in)) != EOF;) job.push_back(char(c));
-    std::fclose(in);
-  }
-  Check(IsStandInJob(job), "file1.tkf is the practice instrument's job");
+  const std::string job = testfiles::ReadAll(receiving + L"\\file1.tkf");
+  Check(IsStandInJob({job.begin(), job.end()}), "file1.tkf is the practice instrument's job");
   Check(TransferFiles() == temporaryBefore, "the temporary .txt file is gone");
   Shot(L"done");
   browser->Destroy();
-  browser->Release();
+  owner.Reset();
   DestroyWindow(frame);
   return g_failures;
 }
@@ -216,6 +190,7 @@ int main() {
   wchar_t** argv = CommandLineToArgvW(GetCommandLineW(), &argc);
   if (argc < 4) return std::printf("usage: download_road <shell_peer> <receiving folder> <shots>\n"), 2;
   g_shots = argv[3];
+  g_pause = argc > 4 ? _wtoi(argv[4]) : 0;
   CreateDirectoryW(argv[2], nullptr);
   CreateDirectoryW(argv[3], nullptr);
   OleInitialize(nullptr);

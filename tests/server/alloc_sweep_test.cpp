@@ -1,8 +1,10 @@
 // Explorer short of memory: whichever allocation fails, no exception, no leak, and the module still unloads.
-// For every N, the Nth allocation of what the host calls (operator new or the task allocator) fails.
+// Each place that allocates (operator new or the task allocator), told apart by its call stack, fails in turn
+// at its first allocation: a loop's later rounds take the same road as its first.
 #include <gtest/gtest.h>
 #include <windows.h>
 #include <commctrl.h>
+#include <algorithm>
 #include <atomic>
 #include <cstdio>
 #include <functional>
@@ -22,8 +24,10 @@ std::atomic<long> liveBlocks{0};  // operator new blocks not yet deleted
 std::atomic<long> liveTaskBlocks{0};  // task allocator blocks made while the spy was in
 DWORD armedThread = 0;
 bool everyThread = false;  // counts other threads too while armed: the view's worker
-std::atomic<long> allocations{0};  // counted on the armed thread
-long failAt = 0;                   // 0: none fails
+// The places met by a run that failed nothing, in order; then the one that fails (0: none).
+ULONG64 places[8192], failAt = 0;
+size_t placeCount = 0;
+SRWLOCK placesLock = SRWLOCK_INIT;
 std::atomic<bool> failed{false};
 // The row's own inputs are made with counting paused: only the module's calls are swept.
 struct Paused {
@@ -31,11 +35,35 @@ struct Paused {
   ~Paused() { armedThread = thread; }
   DWORD thread;
 };
+// A place that allocates: the chain of our own calls that leads to it, leaving out the system's
+// (they change with how a message came) and, on the armed thread, those below the row's call
+// (they change with where the sweep started it).
+USHORT rowDepth = 0;
+USHORT Frames(void** frames) noexcept { return RtlCaptureStackBackTrace(1, 100, frames, nullptr); }
+bool Ours(const void* address) noexcept {
+  static const auto* image = reinterpret_cast<const BYTE*>(GetModuleHandleW(nullptr));
+  static const auto* headers = reinterpret_cast<const IMAGE_NT_HEADERS*>(
+      image + reinterpret_cast<const IMAGE_DOS_HEADER*>(image)->e_lfanew);
+  return address >= image && address < image + headers->OptionalHeader.SizeOfImage;
+}
+ULONG64 Place() noexcept {
+  void* frames[100];
+  USHORT n = Frames(frames);
+  if (GetCurrentThreadId() == armedThread) n -= std::min(n, rowDepth);
+  ULONG64 hash = 14695981039346656037ull;
+  for (USHORT i = 0; i < n; ++i)
+    if (Ours(frames[i])) hash = (hash ^ reinterpret_cast<ULONG_PTR>(frames[i])) * 1099511628211ull;
+  return hash;
+}
 bool ShouldFail() noexcept {
   if (!armedThread || (!everyThread && GetCurrentThreadId() != armedThread)) return false;
-  if (++allocations != failAt) return false;
-  failed = true;
-  return true;
+  const ULONG64 place = Place();
+  if (failAt) return place == failAt && !failed.exchange(true);
+  AcquireSRWLockExclusive(&placesLock);
+  if (std::find(places, places + placeCount, place) == places + placeCount && placeCount < std::size(places))
+    places[placeCount++] = place;
+  ReleaseSRWLockExclusive(&placesLock);
+  return false;
 }
 void* Allocate(size_t size) noexcept {
   void* block = ShouldFail() ? nullptr : std::malloc(size ? size : 1);
@@ -220,40 +248,43 @@ void DownloadCancelled() {
     if (object->GetData(&request, &medium) == S_OK) ReleaseStgMedium(&medium);
   });
 }
-// The view opened in a browser. With `fill` also its worker's enumerator and the rows made
-// from it, after which the clip must have stopped whatever failed; with `use` then, once
-// filled, the menus of its activation, a copy of a level, its paste, a refill by the Details
-// command and the level's property sheet.
-void View(bool fill, bool use = false) {
+// The view opened in a browser; filled, with its worker's enumerator and the rows made from it,
+// after which the clip must have stopped whatever failed; in use, once filled, with the menus of
+// its activation, a copy of a level, its paste and a refill by the Details command; or, once
+// filled, with the level's property sheet.
+enum class Stage { Open, Fill, Use, Sheet };
+void View(Stage stage) {
   com::ComPtr<BrowserDouble> browser = Unswept([] { return com::Make<BrowserDouble>(); });
-  everyThread = fill;
+  everyThread = stage != Stage::Open;
   if (auto root = Root()) {
     IShellView* view = nullptr;
     if (root->CreateViewObject(nullptr, IID_IShellView, reinterpret_cast<void**>(&view)) == S_OK) {
       FOLDERSETTINGS settings{FVM_DETAILS, 0};
       RECT box{0, 0, 300, 200};
       HWND window = nullptr;
-      // In use, the opening and the first fill are left to the rows before.
+      // In use and for the sheet, the opening and the first fill are left to the rows before.
       const DWORD armed = armedThread;
-      if (use) armedThread = 0;
+      if (stage >= Stage::Use) armedThread = 0;
       if (view->CreateViewWindow(nullptr, &settings, browser.Get(), &box, &window) == S_OK) {
         HWND list = FindWindowExW(window, nullptr, WC_LISTVIEWW, nullptr);
         const auto filled = [&] {
           return ui::PumpFor([&] { return !FindWindowExW(list, nullptr, ANIMATE_CLASSW, nullptr); }, 5000);
         };
-        EXPECT_TRUE(!fill || filled()) << "the clip still plays";
-        if (use) {
+        EXPECT_TRUE(stage == Stage::Open || filled()) << "the clip still plays";
+        if (stage >= Stage::Use) {
           LVITEMW selected{};
           selected.stateMask = selected.state = LVIS_SELECTED;
           SendMessageW(list, LVM_SETITEMSTATE, 1, reinterpret_cast<LPARAM>(&selected));
           armedThread = armed;
           view->UIActivate(SVUIA_ACTIVATE_FOCUS);
-          SendMessageW(window, WM_COMMAND, kCmdCopy, 0);
-          SendMessageW(window, WM_COMMAND, kCmdPaste, 0);
-          SendMessageW(window, WM_COMMAND, kCmdDetails, 0);
-          EXPECT_TRUE(filled()) << "the clip of the refill still plays";
-          Unswept([&] { return SendMessageW(list, LVM_SETITEMSTATE, 1, reinterpret_cast<LPARAM>(&selected)); });
-          Dismissing([&] { SendMessageW(window, WM_COMMAND, kCmdProperties, 0); });
+          if (stage == Stage::Sheet) {
+            Dismissing([&] { SendMessageW(window, WM_COMMAND, kCmdProperties, 0); });
+          } else {
+            SendMessageW(window, WM_COMMAND, kCmdCopy, 0);
+            SendMessageW(window, WM_COMMAND, kCmdPaste, 0);
+            SendMessageW(window, WM_COMMAND, kCmdDetails, 0);
+            EXPECT_TRUE(filled()) << "the clip of the refill still plays";
+          }
           Paused paused;
           OleSetClipboard(nullptr);
           CStationRecord copy;
@@ -289,9 +320,10 @@ const Row kRows[] = {
     {"data object: every format and the format list", DataObjectFormats},
     {"data object: a file's contents, its download dialog cancelled", DownloadCancelled},
     {"registration and unregistration", Registration},
-    {"the view's creation, in a browser", [] { View(false); }},
-    {"the view's fill, on its worker thread and the window's", [] { View(true); }},
-    {"the view's menus, a copy, its paste, a refill and a sheet", [] { View(true, true); }},
+    {"the view's creation, in a browser", [] { View(Stage::Open); }},
+    {"the view's fill, on its worker thread and the window's", [] { View(Stage::Fill); }},
+    {"the view's menus, a copy, its paste and a refill", [] { View(Stage::Use); }},
+    {"the view's property sheet of a level", [] { View(Stage::Sheet); }},
 };
 class AllocationSweep : public testing::TestWithParam<Row> {
  protected:
@@ -299,17 +331,18 @@ class AllocationSweep : public testing::TestWithParam<Row> {
   static void TearDownTestSuite() { CoRevokeMallocSpy(); }
   RegistrySandbox sandbox_{{HKEY_CLASSES_ROOT, HKEY_LOCAL_MACHINE, HKEY_CURRENT_USER}};
 };
-// Runs the row with the Nth allocation failing; false once a run met no failure.
-bool RunFailing(const Row& row, long n) {
-  allocations = 0;
-  failAt = n;
+// Runs the row with the first allocation at `place` failing (none for 0); false if none failed.
+bool RunFailing(const Row& row, ULONG64 place) {
+  failAt = place;
   failed = false;
+  void* frames[100];
+  rowDepth = Frames(frames);
   armedThread = GetCurrentThreadId();
   try {
     row.run();
   } catch (...) {
     armedThread = 0;
-    ADD_FAILURE() << "an exception came out with allocation " << n << " failing";
+    ADD_FAILURE() << "an exception came out with an allocation at place " << place << " failing";
     return false;
   }
   armedThread = 0;
@@ -321,21 +354,21 @@ TEST_P(AllocationSweep, NoExceptionNoLeakAndTheModuleUnloads) {
     RegWriteString(HKEY_CURRENT_USER, kStore + std::to_wstring(n), L"Name", n ? L"Beta level" : L"Alpha level");
   RegWriteString(HKEY_LOCAL_MACHINE, L"HARDWARE\\DEVICEMAP\\SERIALCOMM", L"a", L"COM3");  // the sheet's port list
   row.run();  // first-use state of the process is made once, outside the count
+  placeCount = 0;
+  RunFailing(row, 0);
   long swept = 0;
-  for (long n = 1;; ++n) {
+  for (size_t i = 0; i < placeCount && !HasFailure(); ++i) {
     const long blocks = liveBlocks, taskBlocks = liveTaskBlocks;
     long handles = KernelHandleCount();
-    const bool more = RunFailing(row, n);
-    EXPECT_EQ(liveBlocks - blocks, 0) << "with allocation " << n << " failing";
+    swept += RunFailing(row, places[i]);
+    EXPECT_EQ(liveBlocks - blocks, 0) << "with place " << i << " failing";
     // Wine opens some handles once for the life of the process: a leak is what comes back.
-    if (KernelHandleCount() != handles) handles = KernelHandleCount(), RunFailing(row, n);
-    EXPECT_EQ(KernelHandleCount() - handles, 0) << "kernel handles (registry keys too), allocation " << n << " failing";
-    EXPECT_EQ(liveTaskBlocks - taskBlocks, 0) << "task allocator, with allocation " << n << " failing";
-    EXPECT_EQ(com::ModuleLockCount(), 0) << "with allocation " << n << " failing";
-    if (!more || HasFailure()) break;
-    swept = n;
+    if (KernelHandleCount() != handles) handles = KernelHandleCount(), RunFailing(row, places[i]);
+    EXPECT_EQ(KernelHandleCount() - handles, 0) << "kernel handles (registry keys too), place " << i << " failing";
+    EXPECT_EQ(liveTaskBlocks - taskBlocks, 0) << "task allocator, with place " << i << " failing";
+    EXPECT_EQ(com::ModuleLockCount(), 0) << "with place " << i << " failing";
   }
-  std::printf("[ swept    ] %s: %ld allocations\n", row.name, swept);
+  std::printf("[ swept    ] %s: %ld of %zu places\n", row.name, swept, placeCount);
   EXPECT_GT(swept, 0);
 }
 INSTANTIATE_TEST_SUITE_P(Rows, AllocationSweep, testing::ValuesIn(kRows),

@@ -7,14 +7,13 @@
 
 #include <atomic>
 #include <filesystem>
-#include <fstream>
-#include <sstream>
 #include <thread>
 
 #include "config/sheet_driver.h"
 #include "shell/shell_test_util.h"
 #include "store/station_record.h"
 #include "support/child_process.h"
+#include "support/test_files.h"
 
 namespace {
 
@@ -33,12 +32,7 @@ struct Peer {
     GetEnvironmentVariableW(L"MARLIX_SHELL_PEER", peer, MAX_PATH);
     return peer;
   }
-  std::string Output() const {
-    std::ifstream in{std::filesystem::path(output)};
-    std::stringstream text;
-    text << in.rdbuf();
-    return text.str();
-  }
+  std::string Output() const { return testfiles::ReadAll(output); }
   std::wstring output =
       (std::filesystem::temp_directory_path() / (L"drop_peer_" + std::to_wstring(GetCurrentProcessId()) + L".txt"));
   child::Process process;

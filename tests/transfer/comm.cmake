@@ -23,5 +23,7 @@ foreach(run "CancelBeforeStartNeverLoadsTheLibrary:." "MissingLibraryIsReportedW
            --gtest_also_run_disabled_tests --gtest_filter=DownloadDialog.DISABLED_${name})
   marlix_wine_test(comm_${name})
   set_tests_properties(comm_${name} PROPERTIES PASS_REGULAR_EXPRESSION "\\[  PASSED  \\] 1 test\\."
-                       FAIL_REGULAR_EXPRESSION "FAILED")
+                       FAIL_REGULAR_EXPRESSION "FAILED" RESOURCE_LOCK display)
 endforeach()
+# Its dialogs come up on the display that the window tests drive with real input.
+set_tests_properties(comm_tests PROPERTIES RESOURCE_LOCK display)

@@ -15,7 +15,7 @@ marlix_copy_standin(data_tests)
 
 # The clipboard is one for all processes: tests that copy take turns. A copied file is pasted by
 # the shell's stand-in in a process of its own, whose window must not wait on another test's
-# windows on the display: the program runs alone, a second at most.
+# windows on the display.
 add_dependencies(data_tests shell_peer)
-set_tests_properties(data_tests PROPERTIES RESOURCE_LOCK clipboard RUN_SERIAL TRUE
+set_tests_properties(data_tests PROPERTIES RESOURCE_LOCK "clipboard;display"
   ENVIRONMENT "WINEPREFIX=${MARLIX_WINEPREFIX};WINEDEBUG=-all;MARLIX_SHELL_PEER=${MARLIX_SHELL_PEER}")

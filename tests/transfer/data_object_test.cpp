@@ -75,8 +75,8 @@ TEST_F(DataObject, RequestsThatNeedNoTransfer) {
       EXPECT_TRUE(got[i].cfFormat == Request(rows[i].format, 0).cfFormat && got[i].tymed == rows[i].tymed) << i;
     EXPECT_EQ(Fetch(two.Get(), L"Preferred DropEffect"), (std::vector<BYTE>{DROPEFFECT_COPY, 0, 0, 0}));
     // The parent of the first item, then the last id of each, at the offsets of the table.
-    const std::vector<BYTE> parent = IdList({{1, L"Marlix Digital Levels"}, {2, L"North"}}),
-                            file = IdList({{3, L"file1.tkf"}}), level = IdList({{2, L"South"}});
+    const std::vector<BYTE> parent = IdBytes({{1, L"Marlix Digital Levels"}, {2, L"North"}}),
+                            file = IdBytes({{3, L"file1.tkf"}}), level = IdBytes({{2, L"South"}});
     std::vector<BYTE> cida = {2, 0, 0, 0, 16, 0, 0, 0, BYTE(16 + parent.size()), 0, 0, 0,
                               BYTE(16 + parent.size() + file.size()), 0, 0, 0};
     for (auto* part : {&parent, &file, &level}) cida.insert(cida.end(), part->begin(), part->end());

@@ -10,7 +10,7 @@ FORMATETC Request(const wchar_t* format, DWORD tymed, LONG index) {
   return {CLIPFORMAT(RegisterClipboardFormatW(format)), nullptr, DVASPECT_CONTENT, index, tymed};
 }
 
-std::vector<BYTE> IdList(std::initializer_list<std::pair<DWORD, std::wstring>> ids) {
+std::vector<BYTE> IdBytes(std::initializer_list<std::pair<DWORD, std::wstring>> ids) {
   std::vector<BYTE> bytes;
   for (auto& [type, text] : ids) {
     const size_t at = bytes.size(), textBytes = (text.size() + 1) * 2;
@@ -25,8 +25,8 @@ std::vector<BYTE> IdList(std::initializer_list<std::pair<DWORD, std::wstring>> i
 }
 
 LPITEMIDLIST MakeFullList(const std::wstring& level, bool withFile) {
-  const std::vector<BYTE> bytes = withFile ? IdList({{1, L"Marlix Digital Levels"}, {2, level}, {3, L"file1.tkf"}})
-                                           : IdList({{1, L"Marlix Digital Levels"}, {2, level}});
+  const std::vector<BYTE> bytes = withFile ? IdBytes({{1, L"Marlix Digital Levels"}, {2, level}, {3, L"file1.tkf"}})
+                                           : IdBytes({{1, L"Marlix Digital Levels"}, {2, level}});
   return static_cast<LPITEMIDLIST>(std::memcpy(CoTaskMemAlloc(bytes.size()), bytes.data(), bytes.size()));
 }
 

@@ -9,7 +9,7 @@
 
 FORMATETC Request(const wchar_t* format, DWORD tymed, LONG index = -1);
 // Item ids built byte by byte (size, type, text from byte 14), with the list's terminator.
-std::vector<BYTE> IdList(std::initializer_list<std::pair<DWORD, std::wstring>> ids);
+std::vector<BYTE> IdBytes(std::initializer_list<std::pair<DWORD, std::wstring>> ids);
 // A full list of root, level and (optionally) the virtual file, from the task allocator.
 LPITEMIDLIST MakeFullList(const std::wstring& level, bool withFile);
 

@@ -1,4 +1,4 @@
-// Scratch files for the tests of logs, folders and translation files.
+// Scratch files for the tests of logs, folders and translation files, and what other programs wrote.
 #pragma once
 #include <windows.h>
 #include <filesystem>

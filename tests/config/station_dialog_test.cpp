@@ -2,7 +2,6 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
-#include <fstream>
 
 #include "config/sheet_driver.h"
 #include "helpers/app_helpers.h"
@@ -208,26 +207,8 @@ TEST_F(StationSheet, DISABLED_GermanTextsAndEntriesKeepTheirCodes) {
 
 // Saves what the screen shows of `window`, once painted, as a 24-bit BMP.
 bool SaveScreenshot(HWND window, const std::wstring& path) {
-  if (!WaitFor([&] { return ui::Painted(window); })) return false;
   RECT r{};
-  GetWindowRect(window, &r);
-  const int width = r.right - r.left, height = r.bottom - r.top, size = (width * 3 + 3) / 4 * 4 * height;
-  BITMAPINFOHEADER info{sizeof info, width, height, 1, 24, BI_RGB};
-  HDC screen = GetDC(nullptr), memory = CreateCompatibleDC(screen);
-  void* bits = nullptr;
-  HBITMAP bitmap = CreateDIBSection(screen, reinterpret_cast<BITMAPINFO*>(&info), DIB_RGB_COLORS, &bits, nullptr, 0);
-  HGDIOBJ old = SelectObject(memory, bitmap);
-  BitBlt(memory, 0, 0, width, height, screen, r.left, r.top, SRCCOPY);
-  GdiFlush();
-  BITMAPFILEHEADER file{0x4D42, DWORD(sizeof file + sizeof info + size), 0, 0, sizeof file + sizeof info};
-  std::ofstream out(std::filesystem::path(path), std::ios::binary);
-  out.write(reinterpret_cast<const char*>(&file), sizeof file).write(reinterpret_cast<const char*>(&info), sizeof info);
-  out.write(static_cast<const char*>(bits), size);
-  SelectObject(memory, old);
-  DeleteObject(bitmap);
-  DeleteDC(memory);
-  ReleaseDC(nullptr, screen);
-  return out.good();
+  return WaitFor([&] { return ui::Painted(window); }) && GetWindowRect(window, &r) && ui::Screenshot(r, path);
 }
 
 // Pictures of both pages over a sample level for docs/, in the language the program runs in, into

@@ -45,28 +45,11 @@ void Check(bool ok, const char* what) {
   if (!ok) std::printf("FAIL: %s\n", what), ++g_failures;
 }
 
-// A picture of the screen's top left 1024x768 as a 24-bit BMP.
+// A picture of the screen's top left 1024x768.
 void Shot(const wchar_t* name) {
-  const int width = 1024, height = 768;
-  HDC screen = GetDC(nullptr), memory = CreateCompatibleDC(screen);
-  BITMAPINFOHEADER header{sizeof(header), width, height, 1, 24, BI_RGB};
-  void* bits = nullptr;
-  HBITMAP bitmap = CreateDIBSection(screen, reinterpret_cast<BITMAPINFO*>(&header), DIB_RGB_COLORS, &bits, nullptr, 0);
-  HGDIOBJ old = SelectObject(memory, bitmap);
-  BitBlt(memory, 0, 0, width, height, screen, 0, 0, SRCCOPY);
-  GdiFlush();
-  const DWORD size = width * 3 * height;
-  BITMAPFILEHEADER file{0x4D42, DWORD(sizeof(BITMAPFILEHEADER) + sizeof(header) + size), 0, 0,
-                        DWORD(sizeof(BITMAPFILEHEADER) + sizeof(header))};
   wchar_t path[MAX_PATH];
   swprintf(path, MAX_PATH, L"%ls\\%02d-%ls.bmp", g_shots.c_str(), ++g_shot, name);
-  testfiles::WriteBytes(path, std::string(reinterpret_cast<const char*>(&file), sizeof(file)) +
-                                  std::string(reinterpret_cast<const char*>(&header), sizeof(header)) +
-                                  std::string(static_cast<const char*>(bits), size));
-  SelectObject(memory, old);
-  DeleteObject(bitmap);
-  DeleteDC(memory);
-  ReleaseDC(nullptr, screen);
+  ui::Screenshot({0, 0, 1024, 768}, path);
 }
 
 int RowOf(HWND list, const wchar_t* text) {  // -1 if no row shows it

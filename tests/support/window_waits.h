@@ -1,6 +1,8 @@
-// Waiting for windows and driving them as a person would, for the threads that drive modal dialogs.
+// Waiting for windows, driving them as a person would, and pictures of what the screen shows.
 #pragma once
 #include <windows.h>
+#include <filesystem>
+#include <fstream>
 #include <string>
 namespace ui {
 // Waits without handling messages, for a thread beside the one that owns the windows.
@@ -86,6 +88,26 @@ inline void Drag(POINT from, POINT to, int steps = 20) {
   }
   Sleep(200);
   Mouse(MOUSEEVENTF_LEFTUP, to);
+}
+// What the screen shows in `area`, saved as a 24-bit BMP; false if it could not be written.
+inline bool Screenshot(const RECT& area, const std::wstring& path) {
+  const int width = area.right - area.left, height = area.bottom - area.top, size = (width * 3 + 3) / 4 * 4 * height;
+  BITMAPINFOHEADER info{sizeof info, width, height, 1, 24, BI_RGB};
+  HDC screen = GetDC(nullptr), memory = CreateCompatibleDC(screen);
+  void* bits = nullptr;
+  HBITMAP bitmap = CreateDIBSection(screen, reinterpret_cast<BITMAPINFO*>(&info), DIB_RGB_COLORS, &bits, nullptr, 0);
+  HGDIOBJ old = SelectObject(memory, bitmap);
+  BitBlt(memory, 0, 0, width, height, screen, area.left, area.top, SRCCOPY);
+  GdiFlush();
+  BITMAPFILEHEADER file{0x4D42, DWORD(sizeof file + sizeof info + size), 0, 0, sizeof file + sizeof info};
+  std::ofstream out(std::filesystem::path(path), std::ios::binary);
+  out.write(reinterpret_cast<const char*>(&file), sizeof file).write(reinterpret_cast<const char*>(&info), sizeof info);
+  out.write(static_cast<const char*>(bits), size);
+  SelectObject(memory, old);
+  DeleteObject(bitmap);
+  DeleteDC(memory);
+  ReleaseDC(nullptr, screen);
+  return out.good();
 }
 // Text typed into an edit control, replacing what it held.
 inline void Type(HWND edit, const wchar_t* text) {

@@ -70,11 +70,10 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
   HWND frame = CreateWindowExW(0, L"STATIC", L"Marlix Digital Levels", WS_POPUP | WS_VISIBLE | WS_BORDER, 0, 0, 600,
                                420, nullptr, nullptr, nullptr, nullptr);
   Say("1. Wine's ExplorerBrowser opens My Computer\\Marlix Digital Levels");
-  com::ComPtr<IExplorerBrowser> owner = BrowseToFolder(frame, {0, 0, 600, 420});
-  if (!owner) return Say("the browser cannot open the folder"), 1;
-  IExplorerBrowser* browser = owner.Get();
+  com::ComPtr<IExplorerBrowser> browser = BrowseToFolder(frame, {0, 0, 600, 420});
+  if (!browser) return Say("the browser cannot open the folder"), 1;
   HWND root = nullptr;
-  Check(ui::PumpFor([&] { return (root = CurrentList(browser)) && RowOf(root, L"Add New Digital Level") == 0; }),
+  Check(ui::PumpFor([&] { return (root = CurrentList(browser.Get())) && RowOf(root, L"Add New Digital Level") == 0; }),
         "the root lists the add row first");
   ui::PumpFor([&] { return ui::Painted(frame); });
   Shot(L"folder");
@@ -102,7 +101,7 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
     Say("4. A double click on the new level opens it");
     ui::Click(RowPoint(root, RowOf(root, kLevel)), 2);
     if (!ui::WaitFor([&] { return step == 3; })) return;
-    HWND list = CurrentList(browser);
+    HWND list = CurrentList(browser.Get());
     Say("5. file1.tkf is dragged to a folder window of another program");
     POINT from = RowPoint(list, 0), to{800, 175};
     ui::Drag(from, to);
@@ -137,7 +136,7 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
   Shot(L"level-added");
   step = 2;
   Check(ui::PumpFor([&] {
-    HWND list = CurrentList(browser);
+    HWND list = CurrentList(browser.Get());
     return list && list != root && RowOf(list, L"file1.tkf") == 0;
   }), "the level opens and shows file1.tkf");
   ui::PumpFor([&] { return ui::Painted(frame); });
@@ -161,7 +160,7 @@ int Road(const std::wstring& peer, const std::wstring& receiving) {
   Check(TransferFiles() == temporaryBefore, "the temporary .txt file is gone");
   Shot(L"done");
   browser->Destroy();
-  owner.Reset();
+  browser.Reset();
   DestroyWindow(frame);
   return g_failures;
 }
